@@ -1,0 +1,31 @@
+# Installation: headers under include/kel, the library, a relocatable CMake package and a pkg-config file.
+install(TARGETS kel EXPORT kelTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development)
+install(FILES ${kel_headers} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/kel COMPONENT development)
+
+set(kel_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/kel)
+install(EXPORT kelTargets NAMESPACE kel:: FILE kelTargets.cmake DESTINATION ${kel_package_dir} COMPONENT development)
+configure_package_config_file(${PROJECT_SOURCE_DIR}/cmake/kelConfig.cmake.in ${PROJECT_BINARY_DIR}/kelConfig.cmake
+  INSTALL_DESTINATION ${kel_package_dir})
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/kelConfigVersion.cmake COMPATIBILITY SameMajorVersion)
+install(FILES ${PROJECT_BINARY_DIR}/kelConfig.cmake ${PROJECT_BINARY_DIR}/kelConfigVersion.cmake
+  DESTINATION ${kel_package_dir} COMPONENT development)
+
+# Relative install folders make the .pc file relocatable through ${pcfiledir}; absolute ones are taken as they are.
+set(kel_pc_dir ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+if(IS_ABSOLUTE ${kel_pc_dir})
+  set(KEL_PC_PREFIX ${CMAKE_INSTALL_PREFIX})
+else()
+  file(RELATIVE_PATH kel_pc_up /prefix/${kel_pc_dir} /prefix)
+  string(REGEX REPLACE "/$" "" kel_pc_up "${kel_pc_up}")
+  set(KEL_PC_PREFIX "\${pcfiledir}/${kel_pc_up}")
+endif()
+foreach(dir LIBDIR INCLUDEDIR)
+  if(IS_ABSOLUTE ${CMAKE_INSTALL_${dir}})
+    set(KEL_PC_${dir} ${CMAKE_INSTALL_${dir}})
+  else()
+    set(KEL_PC_${dir} "\${prefix}/${CMAKE_INSTALL_${dir}}")
+  endif()
+endforeach()
+configure_file(${PROJECT_SOURCE_DIR}/cmake/kel.pc.in ${PROJECT_BINARY_DIR}/kel.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/kel.pc DESTINATION ${kel_pc_dir} COMPONENT development)

@@ -1,0 +1,402 @@
+/**
+ * @file kelImage.h
+ * The image half of kel: one image record and flat functions over it.
+ *
+ * Compiles as C99 and as C++11 and needs no other header of kel. Unless a function says otherwise
+ *  - the destination comes first, then the sources, then scalar parameters, and the caller has created all of them;
+ *  - a broken precondition writes its condition text, file, line and signature to standard error and aborts, in every
+ *    build type;
+ *  - a pixel type that a function does not handle is not an error: the function returns and writes nothing;
+ *  - functions are reentrant on distinct images; no function keeps state.
+ */
+#ifndef KEL_IMAGE_H
+#define KEL_IMAGE_H
+
+#include <stdint.h>
+
+#if defined(__GNUC__)
+#define KEL_API __attribute__((visibility("default")))
+#else
+#define KEL_API
+#endif
+
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Image record and pixel types
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/** The 32-bit signed integer of the image interface: sizes, counts, thresholds. */
+typedef int32_t kelValue_s32;
+
+/**
+ * Pixel-type codes: 8 x layout + kind.
+ *
+ * The layout fixes channels and their order in memory: G grey; XYZ, ZYX three channels; XYZA, ZYXA four; YUV two
+ * (4:2:2, bytes U, Y0, V, Y1 per pair of pixels). The kind fixes the element: U8, S8 one byte; U16, S16 two; U32, S32,
+ * F32 four; F64 eight. In the terms of others: U8XYZ is BGR, U8XYZA is BGRA, U8ZYX is RGB, U8ZYXA is RGBA, U8YUV is UYVY.
+ *
+ * The library processes U8G, S16G, U8XYZ, U8XYZA, U8ZYX, U8ZYXA and U8YUV; every other code can be created, copied,
+ * cloned, cleared and released only.
+ */
+enum kelPixelType_e {
+    KEL_PIXEL_TYPE_U8G = 0,
+    KEL_PIXEL_TYPE_S8G,
+    KEL_PIXEL_TYPE_U16G,
+    KEL_PIXEL_TYPE_S16G,
+    KEL_PIXEL_TYPE_U32G,
+    KEL_PIXEL_TYPE_S32G,
+    KEL_PIXEL_TYPE_F32G,
+    KEL_PIXEL_TYPE_F64G,
+
+    KEL_PIXEL_TYPE_U8XYZ = 8,
+    KEL_PIXEL_TYPE_S8XYZ,
+    KEL_PIXEL_TYPE_U16XYZ,
+    KEL_PIXEL_TYPE_S16XYZ,
+    KEL_PIXEL_TYPE_U32XYZ,
+    KEL_PIXEL_TYPE_S32XYZ,
+    KEL_PIXEL_TYPE_F32XYZ,
+    KEL_PIXEL_TYPE_F64XYZ,
+
+    KEL_PIXEL_TYPE_U8XYZA = 16,
+    KEL_PIXEL_TYPE_S8XYZA,
+    KEL_PIXEL_TYPE_U16XYZA,
+    KEL_PIXEL_TYPE_S16XYZA,
+    KEL_PIXEL_TYPE_U32XYZA,
+    KEL_PIXEL_TYPE_S32XYZA,
+    KEL_PIXEL_TYPE_F32XYZA,
+    KEL_PIXEL_TYPE_F64XYZA,
+
+    KEL_PIXEL_TYPE_U8ZYX = 24,
+    KEL_PIXEL_TYPE_S8ZYX,
+    KEL_PIXEL_TYPE_U16ZYX,
+    KEL_PIXEL_TYPE_S16ZYX,
+    KEL_PIXEL_TYPE_U32ZYX,
+    KEL_PIXEL_TYPE_S32ZYX,
+    KEL_PIXEL_TYPE_F32ZYX,
+    KEL_PIXEL_TYPE_F64ZYX,
+
+    KEL_PIXEL_TYPE_U8ZYXA = 32,
+    KEL_PIXEL_TYPE_S8ZYXA,
+    KEL_PIXEL_TYPE_U16ZYXA,
+    KEL_PIXEL_TYPE_S16ZYXA,
+    KEL_PIXEL_TYPE_U32ZYXA,
+    KEL_PIXEL_TYPE_S32ZYXA,
+    KEL_PIXEL_TYPE_F32ZYXA,
+    KEL_PIXEL_TYPE_F64ZYXA,
+
+    KEL_PIXEL_TYPE_U8YUV = 40,
+    KEL_PIXEL_TYPE_S8YUV,
+    KEL_PIXEL_TYPE_U16YUV,
+    KEL_PIXEL_TYPE_S16YUV,
+    KEL_PIXEL_TYPE_U32YUV,
+    KEL_PIXEL_TYPE_S32YUV,
+    KEL_PIXEL_TYPE_F32YUV,
+    KEL_PIXEL_TYPE_F64YUV
+};
+
+/**
+ * One image. Made by createKelImage(), createKelImageHeader() or cloneKelImage() only; its fields never change afterwards,
+ * `data` of a header-only image excepted.
+ *
+ * Pixel (x, y) starts at byte (y * step + x) * channels * depth of `data`. Pixels width .. step-1 of a row are padding:
+ * memory of the image that belongs to no pixel. Creation leaves it indeterminate, vector functions may write it, and
+ * contrast stretching reads it; each function says so where it does. Rows are padded to 16 pixels so that
+ * vector functions need no code for row ends.
+ */
+typedef struct kelImage_t_ {
+    kelValue_s32 reserved; /**< Neither written nor read by the library; indeterminate after creation. */
+    kelValue_s32 type;     /**< Pixel-type code, as given to creation. */
+    kelValue_s32 width;    /**< Pixels in a row. */
+    kelValue_s32 height;   /**< Rows. */
+    kelValue_s32 channels; /**< Channels of a pixel, 1 to 4; 0 for an unknown type. */
+    kelValue_s32 depth;    /**< Bytes of a channel element: 1, 2, 4 or 8; 0 for an unknown type. */
+    kelValue_s32 step;     /**< Row pitch in pixels, not bytes: width rounded up to a multiple of 16. */
+    kelValue_s32 size;     /**< Bytes of pixel data: channels * depth * height * step. */
+    unsigned char* data;   /**< First pixel; 16-byte aligned where the library allocated it. */
+    void* buffer;          /**< Heap block behind `data`; owned by the record. */
+} kelImage_t;
+
+/**
+ * Creates a record without pixels; the caller points `data` at memory of its own, laid out with the record's `step`, and
+ * releases the record with releaseKelImageHeader(). `reserved`, `data` and `buffer` are left unset.
+ *
+ * Nothing is validated: a type outside 0..47 gives channels, depth and size 0. `step` and `size` are formed in 32-bit
+ * arithmetic that wraps. A failed allocation is not detected.
+ */
+KEL_API kelImage_t* createKelImageHeader(kelValue_s32 width, kelValue_s32 height, kelValue_s32 type);
+
+/**
+ * Creates an image that owns `size` bytes of 16-byte aligned, uninitialised pixel data; release it with
+ * releaseKelImage(). Validation as createKelImageHeader(); where the pixels cannot be allocated `data` and `buffer` are
+ * null.
+ */
+KEL_API kelImage_t* createKelImage(kelValue_s32 width, kelValue_s32 height, kelValue_s32 type);
+
+/** Frees the record, not its pixels, and nulls the caller's pointer. A null pointer in `*image` is harmless. */
+KEL_API void releaseKelImageHeader(kelImage_t** image);
+
+/** Frees the image with its pixels and nulls the caller's pointer. A null pointer in `*image` is harmless. */
+KEL_API void releaseKelImage(kelImage_t** image);
+
+/** A new image of the same width, height and type with a copy of all `size` bytes, padding included. */
+KEL_API kelImage_t* cloneKelImage(const kelImage_t* src);
+
+/** Copies src->size bytes to dst->data, whatever the two types and sizes are: the destination must have that room. */
+KEL_API void copyKelImage(kelImage_t* dst, const kelImage_t* src);
+
+/** Sets all `size` bytes to zero, padding included. */
+KEL_API void clearKelImage(kelImage_t* image);
+
+/**
+ * Copies a caller's pixels into the top-left corner of an image: min(width, image->width) x min(height, image->height)
+ * pixels. `pitch` is the distance of the caller's rows in pixels, not bytes. Pixels outside the copied
+ * region, padding included, are left alone. Types U8G, S16G, U8XYZ, U8ZYX, U8XYZA and U8ZYXA; any other copies nothing, and
+ * so does a width or height below 1. Nothing is checked.
+ */
+KEL_API void loadKelImageData(kelImage_t* image, const void* src, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch);
+
+/** The mirror of loadKelImageData(): copies the image's top-left corner into the caller's buffer. */
+KEL_API void storeKelImageData(void* dst, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch, const kelImage_t* image);
+
+/** Inert: returns null. The library reads no files. */
+KEL_API kelImage_t* loadKelImage(const char* path);
+
+/** Inert: does nothing. The library writes no files. */
+KEL_API void storeKelImage(const char* path, const kelImage_t* image);
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Rectangles, colour tables and random numbers
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/**
+ * @name Rectangles
+ * Four values in one of three forms: pp1 (x1, y1, x2, y2) two corners; ps1 (x, y, w, h) corner and size; ps2
+ * (cx, cy, w, h) centre and size. The size is the plain difference of the corners. Integer halves truncate toward zero:
+ * pp1 to ps2 halves the sum of the corners, ps1 to ps2 halves the size. The four conversions out of ps2 do nothing.
+ * @{
+ */
+KEL_API void kel_rectangle_translate_pp1_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API void kel_rectangle_translate_pp1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API void kel_rectangle_translate_ps1_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API void kel_rectangle_translate_ps1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API void kel_rectangle_translate_ps2_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API void kel_rectangle_translate_ps2_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API void kel_rectangle_translate_pp1_to_ps1_f32(float* dst, const float* src);
+KEL_API void kel_rectangle_translate_pp1_to_ps2_f32(float* dst, const float* src);
+KEL_API void kel_rectangle_translate_ps1_to_pp1_f32(float* dst, const float* src);
+KEL_API void kel_rectangle_translate_ps1_to_ps2_f32(float* dst, const float* src);
+KEL_API void kel_rectangle_translate_ps2_to_pp1_f32(float* dst, const float* src);
+KEL_API void kel_rectangle_translate_ps2_to_ps1_f32(float* dst, const float* src);
+/** @} */
+
+/**
+ * 216 colours for drawing: the cube of the levels 0, 51, 102, 153, 204, 255. Entry i is 51 * (i / 36), 51 * (i % 6),
+ * 51 * ((i / 6) % 6).
+ */
+KEL_API extern const unsigned char KEL_COLOR_TABLE_SAFE[216][3];
+
+/**
+ * 64 colours of a false-colour ramp, R, G, B from dark blue over cyan and yellow to dark red: with t = 4i / 63 channel c
+ * is 255 * clamp(1.5 - |t - (3 - c)|), ties rounded up.
+ */
+KEL_API extern const unsigned char KEL_COLOR_TABLE_PSEUDO[64][3];
+
+/** rand() % x, in 0 .. x-1. Stops the process on "0<x". Shares the generator of rand(). */
+KEL_API int KEL_RAND(int x);
+
+/**
+ * The sum of twelve draws of rand() % (x + 1) minus 6x: approximately normal, mean 0, standard deviation close to x, within
+ * -6x .. 6x. Always draws twelve times; x is not checked (-1 divides by zero).
+ */
+KEL_API int KEL_RAND_NORMAL(int x);
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Pixel conversion
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/**
+ * Converts `src` into `dst` of equal width and height by the pair of their types.
+ *
+ * | from \ to | U8G        | S16G        | U8XYZ, U8ZYX     | U8XYZA, U8ZYXA                        | U8YUV |
+ * |-----------|------------|-------------|------------------|---------------------------------------|-------|
+ * | U8G       | copy       | U8G_to_S16G | U8G_to_U8XYZ     | U8G_to_U8XYZA                         | -     |
+ * | S16G      | S16G_to_U8G| copy        | S16G_to_U8XYZ    | S16G_to_U8XYZA                        | -     |
+ * | 3 channels| mean       | mean        | same: copy; opposite: reversed | order KEPT, also to the opposite layout | - |
+ * | 4 channels| mean, MISPLACED | mean, MISPLACED | same order: kept; opposite: reversed | same: copy; opposite: reversed | - |
+ * | U8YUV     | luma       | -           | truncated        | rounded                               | copy  |
+ *
+ * Two routes need care, and callers rely on both:
+ *  - Three channels to four channels of the opposite order (U8XYZ to U8ZYXA, U8ZYX to U8XYZA) keep the channel order.
+ *  - FOUR CHANNELS TO GREY WRITE PAST AN ORDINARY DESTINATION: pixel (x, y) lands at element 3 * (y * step + x), so the
+ *    destination's data area needs 3 * step * height elements. The safe way from four channels to grey goes through a
+ *    three-channel image.
+ *
+ * "copy" copies src->size bytes, padding included. A pair marked "-" and any other type does nothing.
+ * Stops the process on "dst->width == src->width && dst->height == src->height".
+ */
+KEL_API void convertKelImage(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * @name Portable converters
+ * One per route. None checks anything; each iterates the destination's width and height with both images' steps and
+ * touches no padding, the YUV ones excepted.
+ * @{
+ */
+KEL_API void convertKelImage_S16G_to_U8G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_S16G_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_S16G_to_U8XYZA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZ_to_U8G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZ_to_S16G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZ_to_U8ZYX(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZ_to_U8XYZA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZA_to_U8G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZA_to_S16G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZA_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZA_to_U8ZYX(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8XYZA_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8YUV_to_U8RGB(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8YUV_to_U8BGR(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8YUV_to_U8BGRA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8YUV_to_U8RGBA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8YUV_to_U8G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8G_to_U8XYZA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8G_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImage_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src);
+/** @} */
+
+/**
+ * @name Vector converters
+ * Blocks of 16 pixels (4 for YUV to four channels) over the destination's width and height, in one continuous run through
+ * both data areas; `step` is not read and nothing is checked.
+ * @{
+ */
+KEL_API void convertKelImageSSE_U8G_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8G_to_U8XYZA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8YUV_to_U8G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8YUV_to_U8RGBA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8YUV_to_U8BGRA(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8YUV_to_U8BGR(kelImage_t* dst, const kelImage_t* src);
+KEL_API void convertKelImageSSE_U8YUV_to_U8RGB(kelImage_t* dst, const kelImage_t* src);
+/** @} */
+
+#ifdef __cplusplus
+}
+#endif
+/**
+ * Reverses the channels and adds alpha 0. No route of convertKelImage() comes here. Its symbol carries the parameter
+ * types, for C callers too.
+ */
+#ifdef __cplusplus
+KEL_API void convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src);
+#else
+KEL_API void
+convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst,
+                                const kelImage_t* src) __asm__("_Z31convertKelImage_U8XYZ_to_U8ZYXAP11kelImage_t_PKS_");
+#endif
+#ifdef __cplusplus
+extern "C" {
+#endif
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Contrast and binarization
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/** Linear contrast stretch of a U8G image to 0..255. */
+KEL_API void adjustKelImage(kelImage_t* dst, const kelImage_t* src);
+KEL_API void adjustKelImage_U8G(kelImage_t* dst, const kelImage_t* src);
+KEL_API void adjustKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src);
+
+/** Fixed threshold on a U8G image. */
+KEL_API void binalizeKelImage(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
+KEL_API void binalizeKelImage_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
+KEL_API void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
+
+/** Threshold against the local mean on a U8G image. */
+KEL_API void binalizeKelImageAdaptive(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
+KEL_API void binalizeKelImageAdaptive_U8G(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
+KEL_API void binalizeKelImageAdaptiveSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Filters
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/** Binomial smoothing, 5x5, optionally with every second sample into `half` (may be null). */
+KEL_API void applyKelFilterGaussian5X5_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
+KEL_API void applyKelFilterGaussian5X5(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
+
+/** Smoothing with (2, 7, 14, 18, 14, 7, 2) / 64 both ways, optionally with every second sample into `half` (may be null). */
+KEL_API void applyKelFilterGaussianSSE7X7_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
+KEL_API void applyKelFilterGaussianSSE7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
+KEL_API void applyKelFilterGaussian7X7_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
+KEL_API void applyKelFilterGaussian7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
+
+/** Cross operator at distance 5. */
+KEL_API void applyKelFilterLaplacianSSE3X3(kelImage_t* dst, kelImage_t* src);
+KEL_API void applyKelFilterLaplacian3X3(kelImage_t* dst, kelImage_t* src);
+
+/** Sobel gradient magnitude. */
+KEL_API void applyKelFilterSobelSSE3X3(kelImage_t* dst, kelImage_t* src);
+KEL_API void applyKelFilterSobel3X3(kelImage_t* dst, kelImage_t* src);
+
+/** Rank filter over a (2n+1) x (2n+1) window. */
+KEL_API void applyKelFilterMedianNXN(kelImage_t* dst, kelImage_t* src, kelValue_s32 n);
+
+/** Inert: returns at once. Use applyKelFilterMedianNXN() with n = 1. */
+KEL_API void applyKelFilterMedian3X3(kelImage_t* dst, kelImage_t* src);
+
+/** Uniform integer noise in -amplitude .. amplitude. */
+KEL_API void applyKelFilterNoise(kelImage_t* dst, kelImage_t* src, kelValue_s32 amplitude);
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Keypoints
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/** One detected keypoint. */
+typedef struct kelKeypoint2DF32_t_ {
+    float x;            /**< Column, sub-pixel. */
+    float y;            /**< Row, sub-pixel. */
+    kelValue_s32 score; /**< Strength after edge rejection, at least 26. */
+    kelValue_s32 tag;   /**< -1 as written by the detector; free for the caller. */
+} kelKeypoint2DF32_t;
+
+/** YAPE keypoints of a smoothed U8G image and its cross response. */
+KEL_API kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoints, kelValue_s32 max, kelImage_t* gaussian,
+                                                  kelImage_t* laplacian);
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Resizing and borders
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/** Checks the types and resizes nothing. */
+KEL_API void resizeKelImage(kelImage_t* dst, const kelImage_t* src);
+KEL_API void resizeKelImageNearest(kelImage_t* dst, const kelImage_t* src);
+KEL_API void resizeKelImageBilinear(kelImage_t* dst, const kelImage_t* src);
+KEL_API void resizeKelImageHalf(kelImage_t* dst, const kelImage_t* src);
+KEL_API void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src);
+KEL_API void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src);
+KEL_API void resizeKelImageEnborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size);
+KEL_API void resizeKelImageDeborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size);
+
+/* ------------------------------------------------------------------------------------------------------------------
+ * Flips and warp
+ * ---------------------------------------------------------------------------------------------------------------- */
+
+/** dst(x, y) = src(W-1-x, y). */
+KEL_API void rotateKelImageH(kelImage_t* dst, const kelImage_t* src);
+/** dst(x, y) = src(x, H-1-y). */
+KEL_API void rotateKelImageV(kelImage_t* dst, const kelImage_t* src);
+/** dst(x, y) = src(W-1-x, H-1-y). */
+KEL_API void rotateKelImageVH(kelImage_t* dst, const kelImage_t* src);
+/** Projective warp by the homography that maps destination to source. */
+KEL_API void rotateKelImageHomography(kelImage_t* dst, const kelImage_t* src, float h0, float h1, float h2, float h3, float h4,
+                                      float h5, float h6, float h7, float h8);
+
+#ifdef __cplusplus
+}
+#endif
+
+#endif

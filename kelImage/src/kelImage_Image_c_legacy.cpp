@@ -1,0 +1,106 @@
+// Life cycle of an image, and the way of pixels in and out of it through the caller's memory.
+#include <algorithm>
+#include <stdlib.h>
+#include <string.h>
+
+#include "kelImage_Private.h"
+#include "kelImage_Type_c.h"
+
+namespace {
+
+// 32-bit arithmetic that wraps: absurd sizes come out as absurd numbers, not as undefined behaviour.
+kelValue_s32 wrappingAdd(kelValue_s32 a, kelValue_s32 b) {
+    return static_cast<kelValue_s32>(static_cast<uint32_t>(a) + static_cast<uint32_t>(b));
+}
+kelValue_s32 wrappingMultiply(kelValue_s32 a, kelValue_s32 b) {
+    return static_cast<kelValue_s32>(static_cast<uint32_t>(a) * static_cast<uint32_t>(b));
+}
+
+constexpr kelValue_s32 kAlignment = 16; // bytes of a vector, and pixels that `step` is a multiple of
+
+void copyRows(unsigned char* dst, ptrdiff_t dstPitch, const unsigned char* src, ptrdiff_t srcPitch, size_t bytes,
+              kelValue_s32 rows) {
+    for (kelValue_s32 y = 0; y < rows; ++y, dst += dstPitch, src += srcPitch)
+        memcpy(dst, src, bytes);
+}
+
+} // namespace
+
+extern "C" {
+
+kelImage_t* createKelImageHeader(kelValue_s32 width, kelValue_s32 height, kelValue_s32 type) {
+    kelImage_t* const image = static_cast<kelImage_t*>(malloc(sizeof(kelImage_t)));
+    image->type = type;
+    image->width = width;
+    image->height = height;
+    image->channels = kel::channelsOfType(type);
+    image->depth = kel::depthOfType(type);
+    image->step = wrappingMultiply(wrappingAdd(width, kAlignment - 1) / kAlignment, kAlignment);
+    image->size = wrappingMultiply(wrappingMultiply(image->channels * image->depth, height), image->step);
+    return image;
+}
+
+kelImage_t* createKelImage(kelValue_s32 width, kelValue_s32 height, kelValue_s32 type) {
+    kelImage_t* const image = createKelImageHeader(width, height, type);
+    // Widened with its sign: a negative sum asks for more than there is, malloc refuses, and data stays null.
+    const ptrdiff_t bytes = wrappingAdd(image->size, kAlignment - 1);
+    image->buffer = malloc(static_cast<size_t>(bytes));
+    const uintptr_t block = reinterpret_cast<uintptr_t>(image->buffer);
+    image->data = reinterpret_cast<unsigned char*>((block + kAlignment - 1) & ~uintptr_t(kAlignment - 1));
+    return image;
+}
+
+void releaseKelImageHeader(kelImage_t** image) {
+    free(*image);
+    *image = nullptr;
+}
+
+void releaseKelImage(kelImage_t** image) {
+    if (*image)
+        free((*image)->buffer);
+    releaseKelImageHeader(image);
+}
+
+kelImage_t* cloneKelImage(const kelImage_t* src) {
+    kelImage_t* const image = createKelImage(src->width, src->height, src->type);
+    copyKelImage(image, src);
+    return image;
+}
+
+void copyKelImage(kelImage_t* dst, const kelImage_t* src) {
+    memcpy(dst->data, src->data, static_cast<size_t>(src->size));
+}
+
+void clearKelImage(kelImage_t* image) {
+    memset(image->data, 0, static_cast<size_t>(image->size));
+}
+
+void loadKelImageData(kelImage_t* image, const void* src, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch) {
+    const kelValue_s32 w = std::min(width, image->width);
+    const kelValue_s32 h = std::min(height, image->height);
+    if (w < 1)
+        return;
+    kel::withPixel(image->type, [=](auto pixel) {
+        const ptrdiff_t bytes = sizeof(pixel);
+        copyRows(image->data, image->step * bytes, static_cast<const unsigned char*>(src), pitch * bytes, w * bytes, h);
+    });
+}
+
+void storeKelImageData(void* dst, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch, const kelImage_t* image) {
+    const kelValue_s32 w = std::min(width, image->width);
+    const kelValue_s32 h = std::min(height, image->height);
+    if (w < 1)
+        return;
+    kel::withPixel(image->type, [=](auto pixel) {
+        const ptrdiff_t bytes = sizeof(pixel);
+        copyRows(static_cast<unsigned char*>(dst), pitch * bytes, image->data, image->step * bytes, w * bytes, h);
+    });
+}
+
+kelImage_t* loadKelImage(const char*) {
+    return nullptr;
+}
+
+void storeKelImage(const char*, const kelImage_t*) {}
+
+} // extern "C"

@@ -1,0 +1,55 @@
+// Rectangles between two corners (pp1), corner and size (ps1), and centre and size (ps2).
+#include "kelImage.h"
+
+namespace {
+
+template <class T> void set(T* rectangle, T a, T b, T c, T d) {
+    rectangle[0] = a;
+    rectangle[1] = b;
+    rectangle[2] = c;
+    rectangle[3] = d;
+}
+
+} // namespace
+
+extern "C" {
+
+void kel_rectangle_translate_pp1_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src) {
+    set(dst, src[0], src[1], src[2] - src[0], src[3] - src[1]);
+}
+
+void kel_rectangle_translate_pp1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src) {
+    set(dst, (src[0] + src[2]) / 2, (src[1] + src[3]) / 2, src[2] - src[0], src[3] - src[1]);
+}
+
+void kel_rectangle_translate_ps1_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src) {
+    set(dst, src[0], src[1], src[0] + src[2], src[1] + src[3]);
+}
+
+void kel_rectangle_translate_ps1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src) {
+    set(dst, src[0] + src[2] / 2, src[1] + src[3] / 2, src[2], src[3]);
+}
+
+void kel_rectangle_translate_pp1_to_ps1_f32(float* dst, const float* src) {
+    set(dst, src[0], src[1], src[2] - src[0], src[3] - src[1]);
+}
+
+void kel_rectangle_translate_pp1_to_ps2_f32(float* dst, const float* src) {
+    set(dst, (src[0] + src[2]) * 0.5f, (src[1] + src[3]) * 0.5f, src[2] - src[0], src[3] - src[1]);
+}
+
+void kel_rectangle_translate_ps1_to_pp1_f32(float* dst, const float* src) {
+    set(dst, src[0], src[1], src[0] + src[2], src[1] + src[3]);
+}
+
+void kel_rectangle_translate_ps1_to_ps2_f32(float* dst, const float* src) {
+    set(dst, src[0] + src[2] * 0.5f, src[1] + src[3] * 0.5f, src[2], src[3]);
+}
+
+// Out of the centre form nothing is converted: callers rely on their destination staying as it is.
+void kel_rectangle_translate_ps2_to_pp1_s32(kelValue_s32*, const kelValue_s32*) {}
+void kel_rectangle_translate_ps2_to_ps1_s32(kelValue_s32*, const kelValue_s32*) {}
+void kel_rectangle_translate_ps2_to_pp1_f32(float*, const float*) {}
+void kel_rectangle_translate_ps2_to_ps1_f32(float*, const float*) {}
+
+} // extern "C"

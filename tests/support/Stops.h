@@ -1,0 +1,28 @@
+// Checks that a call stops the process with an assertion report that names text, source file and signature.
+#ifndef KEL_TESTS_STOPS_H
+#define KEL_TESTS_STOPS_H
+
+#include <gmock/gmock.h>
+#include <gtest/gtest.h>
+#include <string>
+
+namespace kel_test {
+
+// `file` is the path below the project's root; the line number is any. Only GCC spells signatures the library's own way.
+inline testing::Matcher<const std::string&> report(const std::string& text, const std::string& file,
+                                                   const std::string& signature) {
+    const std::string failed = "Assertion `" + text + "' failed.";
+#ifdef __clang__
+    (void)signature;
+    return testing::AllOf(testing::HasSubstr(" " + file + ":"), testing::HasSubstr(failed));
+#else
+    return testing::AllOf(testing::HasSubstr(" " + file + ":"), testing::HasSubstr(": " + signature + ": " + failed));
+#endif
+}
+
+} // namespace kel_test
+
+#define EXPECT_STOPS(statement, text, file, signature)                                                                         \
+    EXPECT_EXIT(statement, testing::KilledBySignal(SIGABRT), kel_test::report(text, file, signature))
+
+#endif
