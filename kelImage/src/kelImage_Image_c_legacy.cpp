@@ -20,6 +20,10 @@ constexpr kelValue_s32 kAlignment = 16; // bytes of a vector, and pixels that `s
 
 void copyRows(unsigned char* dst, ptrdiff_t dstPitch, const unsigned char* src, ptrdiff_t srcPitch, size_t bytes,
               kelValue_s32 rows) {
+    if (rows > 0 && dstPitch == srcPitch && dstPitch == static_cast<ptrdiff_t>(bytes)) { // one run
+        bytes *= rows;
+        rows = 1;
+    }
     for (kelValue_s32 y = 0; y < rows; ++y, dst += dstPitch, src += srcPitch)
         memcpy(dst, src, bytes);
 }

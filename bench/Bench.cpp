@@ -1,0 +1,261 @@
+// Runs the lines under Google Benchmark, takes medians of process CPU time, and prints the table of ratios.
+#include "Bench.h"
+
+#include <algorithm>
+#include <benchmark/benchmark.h>
+#include <cmath>
+#include <cstdio>
+#include <cstring>
+#include <fstream>
+#include <iostream>
+#include <map>
+#include <sstream>
+#if KEL_BENCH_OPENCV
+#include <opencv2/core.hpp>
+#endif
+
+namespace kel_bench {
+
+const std::vector<ImageSize> kImageSizes = {{640, 480, "640x480"}, {1920, 1080, "1920x1080"}, {3840, 2160, "3840x2160"}};
+
+namespace {
+
+struct Line {
+    std::string operation, size;
+    std::vector<Run> runs; // kel, peers, then the bound where there is one
+};
+
+std::vector<Line>& lines() {
+    static std::vector<Line> all;
+    return all;
+}
+
+std::vector<void (*)()>& adders() {
+    static std::vector<void (*)()> all;
+    return all;
+}
+
+const char* const kBound = "bound";
+
+// A plain pass: copies what is both read and written, sets what is only written, sums what is only read.
+Body plainPass(Traffic traffic) {
+    const size_t read = static_cast<size_t>(traffic.read), written = static_cast<size_t>(traffic.written);
+    auto src = std::make_shared<std::vector<unsigned char>>(read + 8, 1);
+    auto dst = std::make_shared<std::vector<unsigned char>>(written + 8, 2);
+    return [=] {
+        const size_t both = std::min(read, written);
+        memcpy(dst->data(), src->data(), both);
+        memset(dst->data() + both, 3, written - both);
+        uint64_t sum = 0;
+        for (size_t i = both; i + 8 <= read; i += 8) {
+            uint64_t word;
+            memcpy(&word, src->data() + i, 8);
+            sum += word;
+        }
+        benchmark::DoNotOptimize(sum);
+        benchmark::ClobberMemory();
+    };
+}
+
+std::string name(const Line& line, const Run& run) {
+    return line.operation + "/" + line.size + "/" + run.who;
+}
+
+double median(std::vector<double> values) {
+    if (values.empty())
+        return NAN;
+    std::sort(values.begin(), values.end());
+    return values[values.size() / 2];
+}
+
+// Keeps the time of every repetition, in microseconds, and leaves a mark of progress.
+class Collector : public benchmark::BenchmarkReporter {
+public:
+    std::map<std::string, std::vector<double>> times;
+    bool ReportContext(const Context&) override { return true; }
+    void ReportRuns(const std::vector<Run>& runs) override {
+        for (const Run& run : runs)
+            if (run.run_type == Run::RT_Iteration && !run.error_occurred)
+                times[run.run_name.function_name].push_back(run.GetAdjustedCPUTime() / 1000);
+        std::cerr << '.' << std::flush;
+    }
+};
+
+struct Row {
+    std::string operation, size, peer, differs;
+    double kel, best, bound;
+};
+
+std::vector<Row> evaluate(const std::map<std::string, std::vector<double>>& times) {
+    std::vector<Row> rows;
+    for (const Line& line : lines()) {
+        Row row{line.operation, line.size, "-", "", NAN, NAN, NAN};
+        for (size_t i = 0; i < line.runs.size(); ++i) {
+            const auto found = times.find(name(line, line.runs[i]));
+            const double time = found == times.end() ? NAN : median(found->second);
+            if (i == 0)
+                row.kel = time;
+            else if (line.runs[i].who == kBound)
+                row.bound = time;
+            else if (!(row.best <= time)) {
+                row.best = time;
+                row.peer = line.runs[i].who;
+                row.differs = line.runs[i].differs;
+            }
+        }
+        if (!std::isnan(row.kel))
+            rows.push_back(row);
+    }
+    return rows;
+}
+
+std::string number(double value, const char* format) {
+    if (std::isnan(value))
+        return "-";
+    char text[32];
+    std::snprintf(text, sizeof text, format, value);
+    return text;
+}
+
+// Geometric mean of kel / best peer over the lines of one size, or of all where `size` is empty.
+double meanRatio(const std::vector<Row>& rows, const std::string& size) {
+    double sum = 0;
+    int count = 0;
+    for (const Row& row : rows)
+        if ((size.empty() || row.size == size) && !std::isnan(row.best)) {
+            sum += std::log(row.kel / row.best);
+            ++count;
+        }
+    return count ? std::exp(sum / count) : NAN;
+}
+
+std::string modelName() {
+    std::ifstream info("/proc/cpuinfo");
+    for (std::string line; std::getline(info, line);)
+        if (line.rfind("model name", 0) == 0)
+            return line.substr(line.find(':') + 2);
+    return "unknown processor";
+}
+
+std::string peers() {
+    std::string text;
+    const auto append = [&](const char* peer, bool present) {
+        text += (text.empty() ? "" : ", ") + std::string(peer) + (present ? "" : " (absent)");
+    };
+#if KEL_BENCH_OPENCV
+    append("OpenCV " CV_VERSION, true);
+#else
+    append("OpenCV", false);
+#endif
+    append("libyuv", KEL_BENCH_LIBYUV);
+    append("Eigen", KEL_BENCH_EIGEN);
+    append("LAPACK", KEL_BENCH_LAPACK);
+    return text;
+}
+
+std::string table(const std::vector<Row>& rows) {
+    std::ostringstream out;
+    out << modelName() << ", GCC " << __VERSION__ << ", one thread; medians of process CPU time in microseconds.\n"
+        << "Peers: " << peers()
+        << ". Ratio: kel / best peer, below 1 kel is faster. Bound: a plain pass over the same bytes.\n\n"
+        << "| operation | size | kel | best peer | ratio | to bound | the peer differs in |\n"
+        << "|---|---|---:|---:|---:|---:|---|\n";
+    for (const Row& row : rows)
+        out << "| " << row.operation << " | " << row.size << " | " << number(row.kel, "%.4g") << " | "
+            << (std::isnan(row.best) ? "-" : number(row.best, "%.4g") + " " + row.peer) << " | "
+            << number(row.kel / row.best, "%.2f") << " | " << number(row.kel / row.bound, "%.2f") << " | " << row.differs
+            << " |\n";
+    out << "\nGeometric mean of the ratios: " << number(meanRatio(rows, "1920x1080"), "%.2f") << " at 1920x1080, "
+        << number(meanRatio(rows, ""), "%.2f") << " over all lines.\n";
+    return out.str();
+}
+
+std::string csv(const std::vector<Row>& rows) {
+    std::ostringstream out;
+    out << "operation,size,kel_us,best_us,peer,ratio,bound_us,differs\n";
+    for (const Row& row : rows)
+        out << row.operation << ',' << row.size << ',' << row.kel << ',' << row.best << ',' << row.peer << ','
+            << row.kel / row.best << ',' << row.bound << ",\"" << row.differs << "\"\n";
+    return out.str();
+}
+
+bool save(const std::string& path, const std::string& text) {
+    std::ofstream out(path);
+    out << text;
+    out.flush();
+    if (!out)
+        std::cerr << "kel_bench: cannot write " << path << '\n';
+    return static_cast<bool>(out);
+}
+
+} // namespace
+
+void add(const std::string& operation, const std::string& size, Traffic traffic, std::vector<Run> runs) {
+    if (traffic.read + traffic.written > 0)
+        runs.push_back({kBound, [=] { return plainPass(traffic); }, ""});
+    lines().push_back({operation, size, std::move(runs)});
+}
+
+Lines::Lines(void (*addLines)()) {
+    adders().push_back(addLines);
+}
+
+ImagePointer image(int width, int height, int type) {
+    ImagePointer made(createKelImage(width, height, type), [](kelImage_t* image) { releaseKelImage(&image); });
+    uint32_t state = 1;
+    const int bytes = made->channels * made->depth;
+    for (int i = 0; i < made->size; ++i) {
+        state = state * 1664525u + 1013904223u;
+        const int x = i / bytes % made->step, y = i / bytes / made->step;
+        made->data[i] = static_cast<unsigned char>(128 + 60 * std::sin(x * 0.05) + 40 * std::cos(y * 0.07) + (state >> 28));
+    }
+    return made;
+}
+
+} // namespace kel_bench
+
+// Options of Google Benchmark (--benchmark_filter=REGEX, ...), --table=FILE and --csv=FILE.
+int main(int argc, char** argv) {
+    using namespace kel_bench;
+    std::string tablePath, csvPath;
+    std::vector<char*> arguments;
+    char interleave[] = "--benchmark_enable_random_interleaving=true", repetitions[] = "--benchmark_repetitions=7",
+         minTime[] = "--benchmark_min_time=0.01";
+    for (int i = 0; i < argc; ++i) {
+        const std::string argument = argv[i];
+        if (argument.rfind("--table=", 0) == 0)
+            tablePath = argument.substr(8);
+        else if (argument.rfind("--csv=", 0) == 0)
+            csvPath = argument.substr(6);
+        else
+            arguments.push_back(argv[i]);
+        if (i == 0)
+            arguments.insert(arguments.end(), {interleave, repetitions, minTime}); // what the user gives comes later and counts
+    }
+    int count = static_cast<int>(arguments.size());
+    benchmark::Initialize(&count, arguments.data());
+    if (benchmark::ReportUnrecognizedArguments(count, arguments.data()))
+        return 1;
+#if KEL_BENCH_OPENCV
+    cv::setNumThreads(1);
+#endif
+    for (void (*addLines)() : adders())
+        addLines();
+    std::stable_sort(lines().begin(), lines().end(), [](const Line& a, const Line& b) { return a.operation < b.operation; });
+    for (const Line& line : lines())
+        for (const Run& run : line.runs)
+            benchmark::RegisterBenchmark(name(line, run).c_str(), [&run](benchmark::State& state) {
+                const Body body = run.prepare();
+                body(); // first touch of every page
+                for (auto _ : state)
+                    body();
+            })->MeasureProcessCPUTime();
+    Collector collector;
+    benchmark::RunSpecifiedBenchmarks(&collector);
+    std::cerr << '\n';
+    const std::vector<Row> rows = evaluate(collector.times);
+    std::cout << table(rows);
+    const bool saved = (tablePath.empty() || save(tablePath, "# Performance\n\n" + table(rows))) &&
+                       (csvPath.empty() || save(csvPath, csv(rows)));
+    return saved ? 0 : 1;
+}
