@@ -148,8 +148,8 @@ bool nr_choldc(kelMat& a) {
 // ---- singular values -------------------------------------------------------------------------------------------------------
 
 bool nr_svdcmp(const kelMat& a, kelMat& u, kelMat& w, kelMat& v) {
-    u = a;
-    return kel::decomposeInPlace(u, true, w, v);
+    u.create(a.m_Height, a.m_Width, false);
+    return kel::decompose(a.m_Data, u, true, w, v);
 }
 
 // ---- symmetric eigenvalues -------------------------------------------------------------------------------------------------

@@ -28,6 +28,40 @@ KEL_INLINE inline float addLanes(float sum, __m128 v, int from, int to) {
     return sum;
 }
 
+// Plane rotation: columns p and q become p c + q s and q c - p s.
+struct Rotation {
+    int p, q;
+    float c, s;
+};
+
+// Rotates N tiles, `tileFloats` apart. The second column of a rotation stays in registers, as it mostly is the first of the next.
+template <int N> void rotate(float* tiles, ptrdiff_t tileFloats, const Rotation* begin, const Rotation* end) {
+    if (begin == end)
+        return;
+    float* P = tiles + kLanes * begin->p;
+    __m128 carried[N];
+    for (int k = 0; k < N; ++k)
+        carried[k] = _mm_load_ps(P + tileFloats * k);
+    for (const Rotation* next = begin; next != end; ++next) {
+        const Rotation r = *next;
+        float *const first = tiles + kLanes * r.p, *const Q = tiles + kLanes * r.q;
+        if (first != P)
+            for (int k = 0; k < N; ++k) {
+                _mm_store_ps(P + tileFloats * k, carried[k]);
+                carried[k] = _mm_load_ps(first + tileFloats * k);
+            }
+        const __m128 c = _mm_set1_ps(r.c), s = _mm_set1_ps(r.s);
+        for (int k = 0; k < N; ++k) {
+            const __m128 x = carried[k], y = _mm_load_ps(Q + tileFloats * k);
+            _mm_store_ps(first + tileFloats * k, _mm_add_ps(_mm_mul_ps(x, c), _mm_mul_ps(y, s)));
+            carried[k] = _mm_sub_ps(_mm_mul_ps(y, c), _mm_mul_ps(x, s));
+        }
+        P = Q;
+    }
+    for (int k = 0; k < N; ++k)
+        _mm_store_ps(P + tileFloats * k, carried[k]);
+}
+
 /*
  * A matrix in tiles of four rows. A tile takes the place of its rows; a vector in it is four rows of one column:
  *
@@ -42,11 +76,12 @@ KEL_INLINE inline float addLanes(float sum, __m128 v, int from, int to) {
 class Tiles {
 public:
     explicit Tiles(kelMat& M)
-        : m_rows(M.m_Height), m_columns(M.m_Width), m_full(M.m_Height / kLanes), m_floats(size_t(kLanes) * M.m_Width),
-          m_data(M.m_Data), m_last(m_floats), m_lines(m_floats) {}
+        : m_rows(M.m_Height), m_columns(M.m_Width), m_full(M.m_Height / kLanes), m_floats(ptrdiff_t(kLanes) * M.m_Width),
+          m_data(M.m_Data), m_last(m_floats), m_spare(m_floats) {}
 
     int rows() const { return m_rows; }
     int columns() const { return m_columns; }
+    ptrdiff_t floats() const { return m_floats; }
     int count() const { return (m_rows + kLanes - 1) / kLanes; }
     float* operator[](int tile) { return tile < m_full ? m_data + m_floats * tile : m_last.data(); }
     float& at(int r, int c) { return (*this)[r / kLanes][kLanes * c + r % kLanes]; }
@@ -62,40 +97,105 @@ public:
             f(m_last.data(), std::max(first - kLanes * m_full, 0), m_rows - kLanes * m_full);
     }
 
-    // From rows to tiles, and back.
-    void pack() {
-        std::fill_n(m_last.data(), m_floats, 0.0f);
-        for (int t = 0; t < count(); ++t) {
-            memcpy(m_lines.data(), m_data + m_floats * t, rowBytes(t));
-            kel::transpose((*this)[t], m_lines.data(), kLanes, m_columns);
-        }
+    // The same with f(tile, from, to, number): number tiles that follow each other at floats() at once, four where there are.
+    template <class F> KEL_INLINE void fromRowByFours(int first, F f) {
+        const std::integral_constant<int, 1> one;
+        int t = first / kLanes;
+        if (first % kLanes != 0 && t < m_full)
+            f((*this)[t++], first % kLanes, kLanes, one);
+        for (; t + 4 <= m_full; t += 4)
+            f(m_data + m_floats * t, 0, kLanes, std::integral_constant<int, 4>());
+        for (; t < m_full; ++t)
+            f(m_data + m_floats * t, 0, kLanes, one);
+        if (t == m_full && kLanes * m_full < m_rows)
+            f(m_last.data(), std::max(first - kLanes * m_full, 0), m_rows - kLanes * m_full, one);
     }
-    void unpack() {
-        for (int t = 0; t < count(); ++t) {
-            kel::transpose(m_lines.data(), (*this)[t], m_columns, kLanes);
-            memcpy(m_data + m_floats * t, m_lines.data(), rowBytes(t));
+
+    // Applies rotations to the tiles first .. last - 1.
+    void rotate(int first, int last, const Rotation* begin, const Rotation* end) {
+        constexpr int kAtOnce = 8;
+        int t = first;
+        for (; t + kAtOnce <= std::min(last, m_full); t += kAtOnce)
+            ::rotate<kAtOnce>(m_data + m_floats * t, m_floats, begin, end);
+        for (; t < last; ++t)
+            ::rotate<1>((*this)[t], 0, begin, end);
+    }
+
+    // Takes the elements from rows of their own or, one tile after the other, from their place.
+    void pack(const float* source) {
+        for (int t = 0; t < m_full; ++t) {
+            float* const tile = m_data + m_floats * t;
+            if (source != m_data) {
+                toTile(tile, source + m_floats * t);
+            } else {
+                toTile(m_spare.data(), tile);
+                copy(tile, m_spare.data());
+            }
+        }
+        std::fill_n(m_spare.data(), m_floats, 0.0f);
+        std::copy_n(source + m_floats * m_full, restFloats(), m_spare.data());
+        toTile(m_last.data(), m_spare.data());
+    }
+    // Puts the tiles first .. last - 1 back into rows, in their place.
+    void unpack(int first, int last) {
+        for (int t = first; t < std::min(last, m_full); ++t) {
+            float* const tile = m_data + m_floats * t;
+            copy(m_spare.data(), tile);
+            toRows(tile, m_spare.data());
+        }
+        if (last > m_full) {
+            toRows(m_spare.data(), m_last.data());
+            std::copy_n(m_spare.data(), restFloats(), m_data + m_floats * m_full);
         }
     }
 
 private:
-    size_t rowBytes(int tile) const { return sizeof(float) * m_columns * std::min(kLanes, m_rows - kLanes * tile); }
+    size_t restFloats() const { return static_cast<size_t>(m_columns) * (m_rows - kLanes * m_full); }
+
+    void copy(float* dst, const float* src) const {
+        for (ptrdiff_t i = 0; i < m_floats; i += kLanes)
+            _mm_store_ps(dst + i, _mm_load_ps(src + i));
+    }
+
+    // By blocks of four columns, the last of which overlaps its neighbour where the columns do not come in fours.
+    void toTile(float* tile, const float* rows) const {
+        const int n = m_columns;
+        if (n < kLanes)
+            return kel::transpose(tile, rows, kLanes, n);
+        for (int j = 0; j < n; j += kLanes) {
+            const int c = std::min(j, n - kLanes);
+            const float* const from = rows + c;
+            __m128 v0 = _mm_loadu_ps(from), v1 = _mm_loadu_ps(from + n), v2 = _mm_loadu_ps(from + 2 * n),
+                   v3 = _mm_loadu_ps(from + 3 * n);
+            _MM_TRANSPOSE4_PS(v0, v1, v2, v3);
+            storeFour(tile + kLanes * c, kLanes, v0, v1, v2, v3);
+        }
+    }
+    void toRows(float* rows, const float* tile) const {
+        const int n = m_columns;
+        if (n < kLanes)
+            return kel::transpose(rows, tile, n, kLanes);
+        for (int j = 0; j < n; j += kLanes) {
+            const int c = std::min(j, n - kLanes);
+            const float* const from = tile + kLanes * c;
+            __m128 v0 = _mm_load_ps(from), v1 = _mm_load_ps(from + kLanes), v2 = _mm_load_ps(from + 2 * kLanes),
+                   v3 = _mm_load_ps(from + 3 * kLanes);
+            _MM_TRANSPOSE4_PS(v0, v1, v2, v3);
+            storeFour(rows + c, n, v0, v1, v2, v3);
+        }
+    }
+    static void storeFour(float* to, int pitch, __m128 v0, __m128 v1, __m128 v2, __m128 v3) {
+        _mm_storeu_ps(to, v0);
+        _mm_storeu_ps(to + pitch, v1);
+        _mm_storeu_ps(to + 2 * pitch, v2);
+        _mm_storeu_ps(to + 3 * pitch, v3);
+    }
 
     const int m_rows, m_columns, m_full;
-    const size_t m_floats; // of a tile
+    const ptrdiff_t m_floats; // of a tile
     float* const m_data;
-    Scratch<float, kLanes * kel::kSmallOrder> m_last, m_lines;
+    Scratch<float, kLanes * kel::kSmallOrder> m_last, m_spare;
 };
-
-// Columns p and q of the tiles first .. last - 1 become p c + q s and q c - p s.
-void rotate(Tiles& M, int first, int last, int p, int q, float c, float s) {
-    const __m128 C = _mm_set1_ps(c), S = _mm_set1_ps(s);
-    for (int t = first; t < last; ++t) {
-        float *const P = M[t] + kLanes * p, *const Q = M[t] + kLanes * q;
-        const __m128 x = _mm_load_ps(P), y = _mm_load_ps(Q);
-        _mm_store_ps(P, _mm_add_ps(_mm_mul_ps(x, C), _mm_mul_ps(y, S)));
-        _mm_store_ps(Q, _mm_sub_ps(_mm_mul_ps(y, C), _mm_mul_ps(x, S)));
-    }
-}
 
 // Dot products of one column with the G groups of four columns that end before column `end`, a lane each. Where the groups
 // reach beyond column 0 it stands in for what is not there.
@@ -144,11 +244,6 @@ template <class F> void withGroups(int columns, F f) {
 }
 
 // The rotations of U, kept until the QR iteration is over: U takes no part in it.
-struct Rotation {
-    int p, q;
-    float c, s;
-};
-
 class Rotations {
 public:
     Rotations() : m_data(m_inside), m_count(0), m_capacity(kInside) {}
@@ -201,21 +296,19 @@ public:
         m_rows = take(static_cast<ptrdiff_t>(n) * n);
     }
 
-    bool run(kelMat& wOut) {
-        U.pack();
+    bool run(const float* a, kelMat& wOut) {
+        U.pack(a);
         bidiagonalize();
         accumulateRight();
-        V.pack();
+        V.pack(v.m_Data);
         if (m_withU)
             accumulateLeft();
         bool converged = true;
         for (int k = n - 1; k >= 0 && converged; --k)
             converged = converge(k);
-        V.unpack();
-        if (m_withU) {
-            applyRotations();
-            U.unpack();
-        }
+        V.unpack(0, V.count());
+        if (m_withU)
+            finishU();
         for (int i = 0; i < n; ++i)
             wOut[i][i] = w[i];
         return converged;
@@ -223,7 +316,7 @@ public:
 
 private:
     static constexpr int kIterations = 30;
-    static constexpr int kTilesInCache = 64;
+    static constexpr int kFewTiles = 16;
 
     const int m, n;
     const bool m_withU;
@@ -275,27 +368,46 @@ private:
     // Reflects the columns right of i by column i, which is multiplied by `scale` then, and the rows below i by row i, all in
     // the rows from i + 1 on. Returns the sum of the magnitudes that column i + 1 has there afterwards.
     template <bool Column, bool Row> float reflect(int i, float scale) {
-        const int l = i + 1;
+        const int count = n - i - 1; // columns
+        const float *const factor = m_factor + kLanes * (i + 1), *const row = m_row + kLanes * (i + 1),
+                           *const step = m_step + kLanes * (i + 1);
         const __m128 scales = _mm_set1_ps(scale);
         float next = 0.0f;
-        U.fromRow(l, [&](float* tile, int from, int to) KEL_INLINE {
-            const __m128 x = _mm_load_ps(tile + kLanes * i);
-            __m128 sum = _mm_setzero_ps();
-            for (int j = kLanes * l; j < kLanes * n; j += kLanes) {
-                __m128 a = _mm_load_ps(tile + j);
-                if (Column) {
-                    a = _mm_add_ps(a, _mm_mul_ps(_mm_load_ps(m_factor + j), x));
-                    _mm_store_ps(tile + j, a);
+        const ptrdiff_t apart = U.floats();
+        U.fromRowByFours(i + 1, [&, count, apart](float* tile, int from, int to, auto number) KEL_INLINE {
+            constexpr int N = number;
+            float *const X = tile + kLanes * i, *const A = X + kLanes;
+            __m128 x[N], sum[N];
+            for (int t = 0; t < N; ++t) {
+                x[t] = _mm_load_ps(X + apart * t);
+                sum[t] = _mm_setzero_ps();
+            }
+            for (int j = 0; j < kLanes * count; j += kLanes) {
+                const __m128 f = Column ? _mm_load_ps(factor + j) : _mm_setzero_ps(),
+                             r = Row ? _mm_load_ps(row + j) : _mm_setzero_ps();
+                for (int t = 0; t < N; ++t) {
+                    __m128 a = _mm_load_ps(A + apart * t + j);
+                    if (Column) {
+                        a = _mm_add_ps(a, _mm_mul_ps(f, x[t]));
+                        _mm_store_ps(A + apart * t + j, a);
+                    }
+                    if (Row)
+                        sum[t] = _mm_add_ps(sum[t], _mm_mul_ps(a, r));
                 }
-                if (Row)
-                    sum = _mm_add_ps(sum, _mm_mul_ps(a, _mm_load_ps(m_row + j)));
             }
             if (Row)
-                for (int j = kLanes * l; j < kLanes * n; j += kLanes)
-                    _mm_store_ps(tile + j, _mm_add_ps(_mm_load_ps(tile + j), _mm_mul_ps(sum, _mm_load_ps(m_step + j))));
-            if (Column)
-                _mm_store_ps(tile + kLanes * i, _mm_mul_ps(x, scales));
-            next = addLanes(next, magnitude(_mm_load_ps(tile + kLanes * l)), from, to);
+                for (int j = 0; j < kLanes * count; j += kLanes) {
+                    const __m128 s = _mm_load_ps(step + j);
+                    for (int t = 0; t < N; ++t) {
+                        float* const a = A + apart * t + j;
+                        _mm_store_ps(a, _mm_add_ps(_mm_load_ps(a), _mm_mul_ps(sum[t], s)));
+                    }
+                }
+            for (int t = 0; t < N; ++t) {
+                if (Column)
+                    _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], scales));
+                next = addLanes(next, magnitude(_mm_load_ps(A + apart * t)), from, to);
+            }
         });
         return next;
     }
@@ -405,25 +517,39 @@ private:
             to[j] += factor * values[j];
     }
 
-    // Column i of the tile gives its multiples to the columns right of it and is multiplied itself.
-    KEL_INLINE void spread(float* tile, int i, __m128 multiplier) const {
-        const __m128 x = _mm_load_ps(tile + kLanes * i);
-        for (int j = kLanes * (i + 1); j < kLanes * n; j += kLanes)
-            _mm_store_ps(tile + j, _mm_add_ps(_mm_load_ps(tile + j), _mm_mul_ps(_mm_load_ps(m_factor + j), x)));
-        _mm_store_ps(tile + kLanes * i, _mm_mul_ps(x, multiplier));
+    // Column i of N tiles gives its multiples to the columns right of it and is multiplied itself.
+    template <int N> KEL_INLINE void spread(float* tiles, int i, __m128 multiplier) const {
+        const ptrdiff_t apart = U.floats();
+        const float* const factor = m_factor + kLanes * (i + 1);
+        float *const X = tiles + kLanes * i, *const A = X + kLanes;
+        const int count = n - i - 1;
+        __m128 x[N];
+        for (int t = 0; t < N; ++t)
+            x[t] = _mm_load_ps(X + apart * t);
+        for (int j = 0; j < kLanes * count; j += kLanes) {
+            const __m128 f = _mm_load_ps(factor + j);
+            for (int t = 0; t < N; ++t) {
+                float* const a = A + apart * t + j;
+                _mm_store_ps(a, _mm_add_ps(_mm_load_ps(a), _mm_mul_ps(f, x[t])));
+            }
+        }
+        for (int t = 0; t < N; ++t)
+            _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], multiplier));
     }
 
     // Step i of the left-hand transformations on the rows from i on, and with it the dot products that step i - 1 needs.
     template <int G> void spreadAndSum(int i, float multiplier) {
         const __m128 multipliers = _mm_set1_ps(multiplier);
+        const ptrdiff_t apart = U.floats();
         Dots<G> sums(i - 1, n);
         const int head = i / kLanes;
-        spread(U[head], i, multipliers);
+        spread<1>(U[head], i, multipliers);
         U.at(i, i) += 1.0f;
         sums.add(U[head], i % kLanes, std::min(kLanes, m - kLanes * head));
-        U.fromRow(kLanes * (head + 1), [&](float* tile, int from, int to) KEL_INLINE {
-            spread(tile, i, multipliers);
-            sums.add(tile, from, to);
+        U.fromRowByFours(kLanes * (head + 1), [&, apart](float* tiles, int from, int to, auto number) KEL_INLINE {
+            spread<number>(tiles, i, multipliers);
+            for (int t = 0; t < number; ++t)
+                sums.add(tiles + apart * t, from, to);
         });
         sums.store(m_sums + n);
     }
@@ -448,7 +574,8 @@ private:
                 dots(i - 1, i - 1, n - kLanes * kMostGroups, i);
             } else {
                 const __m128 multipliers = _mm_set1_ps(reciprocal);
-                U.fromRow(0, [&](float* tile, int, int) KEL_INLINE { spread(tile, 0, multipliers); });
+                U.fromRowByFours(0, [&](float* tiles, int, int, auto number)
+                                        KEL_INLINE { spread<number>(tiles, 0, multipliers); });
                 U.at(0, 0) += 1.0f;
             }
         }
@@ -526,7 +653,7 @@ private:
             g = g * c - x * s;
             h = y * s;
             y = y * c;
-            rotate(V, 0, V.count(), j, i, c, s);
+            rotateAll(V, {j, i, c, s});
             length = kel::pythag(f, h);
             w[j] = length;
             if (length != 0.0f) { // else c and s stay
@@ -543,20 +670,24 @@ private:
         w[k] = x;
     }
 
+    static void rotateAll(Tiles& M, const Rotation& rotation) { M.rotate(0, M.count(), &rotation, &rotation + 1); }
+
     // A small U turns at once, beside the long chains of divisions and roots above; a large one in the end, part by part.
     void rotateU(int p, int q, float c, float s) {
         if (!m_withU)
             return;
-        if (U.count() <= kTilesInCache)
-            rotate(U, 0, U.count(), p, q, c, s);
+        if (U.count() <= kFewTiles)
+            rotateAll(U, {p, q, c, s});
         else
             m_rotations.add({p, q, c, s});
     }
 
-    void applyRotations() {
-        for (int first = 0; first < U.count(); first += kTilesInCache)
-            for (const Rotation& r : m_rotations)
-                rotate(U, first, std::min(first + kTilesInCache, U.count()), r.p, r.q, r.c, r.s);
+    void finishU() {
+        for (int first = 0; first < U.count(); first += kFewTiles) {
+            const int last = std::min(first + kFewTiles, U.count());
+            U.rotate(first, last, m_rotations.begin(), m_rotations.end());
+            U.unpack(first, last);
+        }
     }
 };
 
@@ -564,11 +695,11 @@ private:
 
 namespace kel {
 
-bool decomposeInPlace(kelMat& u, bool accumulate, kelMat& w, kelMat& v) {
+bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v) {
     const int n = u.m_Width;
     w.create(n, n, true);
     v.create(n, n, true);
-    return n == 0 || Svd(u, accumulate, v).run(w);
+    return n == 0 || Svd(u, withU, v).run(a, w);
 }
 
 } // namespace kel

@@ -83,10 +83,10 @@ void multiply(float* R, const float* A, const float* B, int rows, int inner, int
 // T = the transpose of A (rows x columns), apart from A.
 void transpose(float* T, const float* A, int rows, int columns);
 
-// Singular value decomposition of the m x n matrix in u: w and v are created, n x n. With `accumulate` u becomes the matrix of
-// the left singular vectors. Without, u is left with nothing of use, which costs less than half; w and v have the same bits.
-// False where a value does not converge.
-bool decomposeInPlace(kelMat& u, bool accumulate, kelMat& w, kelMat& v);
+// Singular value decomposition of a, which has the size of u and is u.m_Data itself or apart from it. Creates w and v, n x n.
+// With `withU` u becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs less than
+// half, and w and v have the same bits. False where a value does not converge.
+bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v);
 
 } // namespace kel
 
