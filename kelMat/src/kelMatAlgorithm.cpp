@@ -48,27 +48,18 @@ template <int Rows> void multiplyRows(float* R, const float* A, const float* B, 
         multiplyColumn<Rows>(R + j, A, B + j, inner, columns);
 }
 
-// to[i] -= factor * from[i].
-void subtractMultiple(float* to, float factor, const float* from, int count) {
-    const __m128 factors = _mm_set1_ps(factor);
-    int i = 0;
-    for (; i + kLanes <= count; i += kLanes)
-        _mm_storeu_ps(to + i, _mm_sub_ps(_mm_loadu_ps(to + i), _mm_mul_ps(factors, _mm_loadu_ps(from + i))));
-    for (; i < count; ++i)
-        to[i] -= factor * from[i];
-}
-
 } // namespace
 
 namespace kel {
 
 void multiply(float* R, const float* A, const float* B, int rows, int inner, int columns) {
-    constexpr int kAtOnce = 3;
-    int i = 0;
-    for (; i + kAtOnce <= rows;
-         i += kAtOnce, A += kAtOnce * static_cast<ptrdiff_t>(inner), R += kAtOnce * static_cast<ptrdiff_t>(columns))
-        multiplyRows<kAtOnce>(R, A, B, inner, columns);
-    for (; i < rows; ++i, A += inner, R += columns)
+    for (; rows >= 4; rows -= 4, A += 4 * static_cast<ptrdiff_t>(inner), R += 4 * static_cast<ptrdiff_t>(columns))
+        multiplyRows<4>(R, A, B, inner, columns);
+    if (rows == 3)
+        multiplyRows<3>(R, A, B, inner, columns);
+    else if (rows == 2)
+        multiplyRows<2>(R, A, B, inner, columns);
+    else if (rows == 1)
         multiplyRows<1>(R, A, B, inner, columns);
 }
 
@@ -152,7 +143,7 @@ bool decomposeByRows(float* a, int n, float* scales, int* indx, float* d) {
         if (row < j)
             return false;
         for (int i = j + 1; i < n; ++i)
-            subtractMultiple(a + i * n + j + 1, a[i * n + j], a + j * n + j + 1, n - j - 1);
+            kel::subtractMultiple(a + i * n + j + 1, a[i * n + j], a + j * n + j + 1, n - j - 1);
     }
     return true;
 }
