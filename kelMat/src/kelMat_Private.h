@@ -101,6 +101,11 @@ void transpose(float* T, const float* A, int rows, int columns);
 // half, and w and v have the same bits. False where a value does not converge.
 bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v);
 
+// The w and v of nr_svdcmp(), bit for bit, where a is not needed any more.
+inline bool decomposeWithoutU(kelMat& a, kelMat& w, kelMat& v) {
+    return decompose(a.m_Data, a, false, w, v);
+}
+
 } // namespace kel
 
 #endif
