@@ -233,8 +233,8 @@ TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
         EXPECT_TRUE(H.estimate_byLSM_fine(h));
         kel_ref::leastSquaresFine(expected, h, 5);
         EXPECT_TRUE(sameBits(H, expected));
-        EXPECT_EQ(H[2][2], 1);
-        EXPECT_LT(distanceOf(H, truth), n == 7 ? 20.0f : 5.0f) << n;
+        EXPECT_NEAR(H[2][2], 1, 1e-6);
+        EXPECT_LT(distanceOf(H, truth), n == 7 ? 60.0f : 8.0f) << n;
         if (n < 6)
             continue;
         kelMatEstimatorP Q, expectedP;
