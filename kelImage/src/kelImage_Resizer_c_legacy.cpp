@@ -4,7 +4,6 @@
 #include <smmintrin.h>
 #include <stdlib.h>
 #include <string.h>
-#include <vector>
 
 #include "kelImage_Private.h"
 
@@ -46,27 +45,50 @@ Sample sampleAt(kelValue_s32 x, float ratio) {
     return {index, position - static_cast<float>(index)};
 }
 
-// dst[x] = src[x * ratio + ratio / 2], by a loop of its own for the ratios that matter.
-template <int R, class P> void decimate(P* __restrict dst, const P* __restrict src, ptrdiff_t width) {
-    for (ptrdiff_t x = 0; x < width; ++x)
-        dst[x] = src[x * R];
+__m128i load(const void* p) {
+    return _mm_loadu_si128(static_cast<const __m128i*>(p));
 }
-template <class P> void decimateRow(P* dst, const P* src, ptrdiff_t width, ptrdiff_t ratio, ptrdiff_t offset) {
-    src += offset;
-    switch (ratio) {
-    case 1:
-        memcpy(dst, src, width * sizeof(P));
-        return;
-    case 2:
-        return decimate<2>(dst, src, width);
-    case 3:
-        return decimate<3>(dst, src, width);
-    case 4:
-        return decimate<4>(dst, src, width);
-    default:
-        for (ptrdiff_t x = 0; x < width; ++x)
-            dst[x] = src[x * ratio];
+void store(void* p, __m128i v) {
+    _mm_storeu_si128(static_cast<__m128i*>(p), v);
+}
+
+// The even or the odd pixels of two vectors, in order.
+template <bool odd> __m128i everySecond(__m128i low, __m128i high, Pixel<1>) {
+    const __m128i mask = _mm_set1_epi16(0xff);
+    return odd ? _mm_packus_epi16(_mm_srli_epi16(low, 8), _mm_srli_epi16(high, 8))
+               : _mm_packus_epi16(_mm_and_si128(low, mask), _mm_and_si128(high, mask));
+}
+template <bool odd> __m128i everySecond(__m128i low, __m128i high, Pixel<2>) {
+    const __m128i mask = _mm_set1_epi32(0xffff);
+    return odd ? _mm_packus_epi32(_mm_srli_epi32(low, 16), _mm_srli_epi32(high, 16))
+               : _mm_packus_epi32(_mm_and_si128(low, mask), _mm_and_si128(high, mask));
+}
+template <bool odd> __m128i everySecond(__m128i low, __m128i high, Pixel<4>) {
+    constexpr int order = odd ? _MM_SHUFFLE(3, 1, 3, 1) : _MM_SHUFFLE(2, 0, 2, 0);
+    return _mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(low), _mm_castsi128_ps(high), order));
+}
+
+// dst[x] = src[2 * x + odd], reading nothing beyond pixel 2 * width - 1.
+template <bool odd, class P> void halveRow(P* dst, const P* src, ptrdiff_t width) {
+    ptrdiff_t x = 0;
+    if constexpr (sizeof(P) != 3) {
+        constexpr ptrdiff_t block = 16 / sizeof(P);
+        for (; x + block <= width; x += block)
+            store(dst + x, everySecond<odd>(load(src + 2 * x), load(src + 2 * x + block), Pixel<sizeof(P)>()));
     }
+    for (; x < width; ++x)
+        dst[x] = src[2 * x + odd];
+}
+
+// dst[x] = src[x * ratio + ratio / 2].
+template <class P> void decimateRow(P* dst, const P* src, ptrdiff_t width, ptrdiff_t ratio) {
+    if (ratio == 1)
+        memcpy(dst, src, width * sizeof(P));
+    else if (ratio == 2)
+        halveRow<true>(dst, src, width);
+    else
+        for (ptrdiff_t x = 0; x < width; ++x)
+            dst[x] = src[x * ratio + ratio / 2];
 }
 
 template <class P> void nearest(kelImage_t* dst, const kelImage_t* src) {
@@ -75,7 +97,7 @@ template <class P> void nearest(kelImage_t* dst, const kelImage_t* src) {
         P* const to = rowByWidth<P>(dst, y);
         const P* const from = rowByWidth<P>(src, sampleAt(y, static_cast<float>(ry)).index);
         if (src->width < kExactSize)
-            decimateRow(to, from, dst->width, rx, rx / 2);
+            decimateRow(to, from, dst->width, rx);
         else
             for (kelValue_s32 x = 0; x < dst->width; ++x)
                 to[x] = from[sampleAt(x, static_cast<float>(rx)).index];
@@ -120,7 +142,7 @@ void bilinearExact(kelImage_t* dst, const kelImage_t* src, kelValue_s32 rx, kelV
         const uint8_t* const s = rowByWidth<uint8_t>(src, iy);
         const uint8_t* const below = ry % 2 && iy != src->height - 1 ? s + src->width : s;
         if (rx % 2 == 0 && below == s) {
-            decimateRow(to, s, dst->width, rx, rx / 2);
+            decimateRow(to, s, dst->width, rx);
             continue;
         }
         averageRow(to, s + rx / 2, below + rx / 2, dst->width - clamped, rx % 2, rx);
@@ -176,18 +198,28 @@ struct Steps {
     }
 };
 
+// Three channels of two neighbours as words in pairs (p0, n0, p1, n1, p2, n2, 0, 0), times (256 - weight, weight), summed in
+// pairs: at most 255 * 256. `weights` is the pair in each 32-bit lane.
+__m128i mixed(const uint32_t* pair, __m128i weights) {
+    const __m128i words = _mm_shuffle_epi8(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(pair)),
+                                           _mm_setr_epi8(0, -1, 4, -1, 1, -1, 5, -1, 2, -1, 6, -1, -1, -1, -1, -1));
+    return _mm_srli_epi32(_mm_madd_epi16(words, weights), 8);
+}
+
 // Interpolates a row along x; the fourth channel becomes 0. The neighbour of the row's last pixel is the next in memory.
 void interpolateAcross(uint32_t* to, const uint32_t* from, const Steps& steps, kelValue_s32 width) {
-    const __m128i zero = _mm_setzero_si128(),
-                  threeChannels = _mm_setr_epi8(-1, -1, -1, 0, -1, -1, -1, 0, 0, 0, 0, 0, 0, 0, 0, 0);
-    for (kelValue_s32 i = 0; i < width; ++i) {
-        const __m128i pair = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(from + steps.index[i]));
-        const int weight = steps.weight[i];
-        const __m128i weights =
-            _mm_unpacklo_epi64(_mm_set1_epi16(static_cast<short>(256 - weight)), _mm_set1_epi16(static_cast<short>(weight)));
-        const __m128i products = _mm_mullo_epi16(_mm_unpacklo_epi8(pair, zero), weights); // at most 255 * 256, unsigned
-        const __m128i sum = _mm_srli_epi16(_mm_add_epi16(products, _mm_srli_si128(products, 8)), 8);
-        to[i] = static_cast<uint32_t>(_mm_cvtsi128_si32(_mm_and_si128(_mm_packus_epi16(sum, zero), threeChannels)));
+    const auto weights = [&](kelValue_s32 i) { return _mm_set1_epi32((steps.weight[i] << 16) | (256 - steps.weight[i])); };
+    const kelValue_s32* const index = steps.index.get();
+    kelValue_s32 i = 0;
+    for (; i + 4 <= width; i += 4) {
+        const __m128i low = _mm_packus_epi32(mixed(from + index[i], weights(i)), mixed(from + index[i + 1], weights(i + 1)));
+        const __m128i high =
+            _mm_packus_epi32(mixed(from + index[i + 2], weights(i + 2)), mixed(from + index[i + 3], weights(i + 3)));
+        store(to + i, _mm_packus_epi16(low, high));
+    }
+    for (; i < width; ++i) {
+        const __m128i words = _mm_packus_epi32(mixed(from + index[i], weights(i)), _mm_setzero_si128());
+        to[i] = static_cast<uint32_t>(_mm_cvtsi128_si32(_mm_packus_epi16(words, words)));
     }
 }
 
@@ -200,11 +232,10 @@ void interpolateDown(uint8_t* to, const uint8_t* above, const uint8_t* below, in
     };
     ptrdiff_t i = 0;
     for (; i + 16 <= bytes; i += 16) {
-        const __m128i a = _mm_loadu_si128(reinterpret_cast<const __m128i*>(above + i));
-        const __m128i b = _mm_loadu_si128(reinterpret_cast<const __m128i*>(below + i));
+        const __m128i a = load(above + i), b = load(below + i);
         const __m128i low = mix(_mm_unpacklo_epi8(a, zero), _mm_unpacklo_epi8(b, zero));
         const __m128i high = mix(_mm_unpackhi_epi8(a, zero), _mm_unpackhi_epi8(b, zero));
-        _mm_storeu_si128(reinterpret_cast<__m128i*>(to + i), _mm_packus_epi16(low, high));
+        store(to + i, _mm_packus_epi16(low, high));
     }
     for (; i < bytes; ++i)
         to[i] = static_cast<uint8_t>((below[i] * weight + above[i] * (256 - weight)) >> 8);
@@ -226,6 +257,7 @@ struct Ratio {
 
     Ratio(kelValue_s32 outputs, kelValue_s32 inputs)
         : repeat(outputs / gcd(outputs, inputs)), box(inputs / gcd(outputs, inputs)) {}
+    bool isHalf() const { return repeat == 1 && box == 2; }
     Box at(kelValue_s32 output) const {
         const int64_t begin = output * box, end = begin + box;
         const int64_t first = begin / repeat, last = (end - 1) / repeat;
@@ -235,82 +267,124 @@ struct Ratio {
     }
 };
 
-// Exact division of sums up to 255 * box, rounding down: by a multiplication where 255 * box * box < 2^32, else as it is.
-class Division {
-public:
-    explicit Division(int64_t divisor)
-        : m_divisor(static_cast<uint32_t>(divisor)), m_fast(255 * divisor * divisor < int64_t(1) << 32),
-          m_magic(static_cast<uint32_t>(((int64_t(1) << 32) + divisor - 1) / divisor)) {}
+// Sums of bytes that are averaged over a box, and their division by it, rounding down. In 16 bits it is exact by a
+// multiplication with ceil(2^16 / box) as long as 255 * box * box < 2^16; larger boxes sum in 32 bits, and divide by
+// ceil(2^32 / box) as long as that, too, is exact.
+constexpr int64_t kWordBox = 16, kReciprocalBox = 4103;
 
-    bool isFast() const { return m_fast; }
-    uint32_t of(uint32_t sum) const { return sum / m_divisor; }
-    // Four sums at once, the fast way only. Division by 1 has no 32-bit reciprocal.
-    __m128i of(__m128i sums) const {
-        if (m_divisor == 1)
-            return sums;
-        const __m128i magic = _mm_set1_epi32(static_cast<int>(m_magic));
-        const __m128i even = _mm_srli_epi64(_mm_mul_epu32(sums, magic), 32);
-        const __m128i odd = _mm_mul_epu32(_mm_srli_epi64(sums, 32), magic);
-        return _mm_blend_epi16(even, odd, 0xcc);
+// Two pixels as eight sums of 16 bits, for boxes up to kWordBox.
+struct WordSums {
+    using Lanes = __m128i;
+    static Lanes widened(uint64_t twoPixels) { return _mm_cvtepu8_epi16(_mm_cvtsi64_si128(static_cast<long long>(twoPixels))); }
+    static Lanes times(Lanes v, int64_t factor) { return _mm_mullo_epi16(v, _mm_set1_epi16(static_cast<short>(factor))); }
+    static Lanes plus(Lanes a, Lanes b) { return _mm_add_epi16(a, b); }
+    static uint64_t average(Lanes sums, int64_t box) {
+        const __m128i magic = _mm_set1_epi16(static_cast<short>((65536 + box - 1) / box)); // 2^16 / 1 is no word
+        const __m128i result = box == 1 ? sums : _mm_mulhi_epu16(sums, magic);
+        return static_cast<uint64_t>(_mm_cvtsi128_si64(_mm_packus_epi16(result, result)));
     }
-
-private:
-    uint32_t m_divisor;
-    bool m_fast;
-    uint32_t m_magic;
 };
 
-__m128i widened(uint32_t pixel) {
-    return _mm_cvtepu8_epi32(_mm_cvtsi32_si128(static_cast<int>(pixel)));
-}
-__m128i times(__m128i v, kelValue_s32 factor) {
-    return _mm_mullo_epi32(v, _mm_set1_epi32(factor));
-}
-
-uint32_t quotient(__m128i sums, const Division& division) {
-    if (!division.isFast()) {
-        alignas(16) uint32_t sum[4];
-        _mm_store_si128(reinterpret_cast<__m128i*>(sum), sums);
-        sums = _mm_setr_epi32(static_cast<int>(division.of(sum[0])), static_cast<int>(division.of(sum[1])),
-                              static_cast<int>(division.of(sum[2])), static_cast<int>(division.of(sum[3])));
-    } else {
-        sums = division.of(sums);
+// Two pixels as eight sums of 32 bits.
+struct LongSums {
+    struct Lanes {
+        __m128i low, high;
+    };
+    static Lanes widened(uint64_t twoPixels) {
+        return {_mm_cvtepu8_epi32(_mm_cvtsi32_si128(static_cast<int>(twoPixels))),
+                _mm_cvtepu8_epi32(_mm_cvtsi32_si128(static_cast<int>(twoPixels >> 32)))};
     }
-    const __m128i words = _mm_packus_epi32(sums, sums);
-    return static_cast<uint32_t>(_mm_cvtsi128_si32(_mm_packus_epi16(words, words)));
+    static Lanes times(Lanes v, int64_t factor) {
+        const __m128i f = _mm_set1_epi32(static_cast<int>(factor));
+        return {_mm_mullo_epi32(v.low, f), _mm_mullo_epi32(v.high, f)};
+    }
+    static Lanes plus(Lanes a, Lanes b) { return {_mm_add_epi32(a.low, b.low), _mm_add_epi32(a.high, b.high)}; }
+    static __m128i divided(__m128i sums, int64_t box) {
+        if (box <= kReciprocalBox) {
+            const __m128i magic = _mm_set1_epi32(static_cast<int>(((int64_t(1) << 32) + box - 1) / box));
+            const __m128i even = _mm_srli_epi64(_mm_mul_epu32(sums, magic), 32);
+            const __m128i odd = _mm_mul_epu32(_mm_srli_epi64(sums, 32), magic);
+            return _mm_blend_epi16(even, odd, 0xcc);
+        }
+        alignas(16) uint32_t sum[4];
+        store(sum, sums);
+        for (uint32_t& value : sum)
+            value /= static_cast<uint32_t>(box);
+        return load(sum);
+    }
+    static uint64_t average(Lanes sums, int64_t box) {
+        const __m128i words = _mm_packus_epi32(divided(sums.low, box), divided(sums.high, box));
+        return static_cast<uint64_t>(_mm_cvtsi128_si64(_mm_packus_epi16(words, words)));
+    }
+};
+
+// The average of the inputs under a box; input(k) gives two pixels.
+template <class Sums, class Input> uint64_t averageOf(const Box& box, const Ratio& ratio, Input input) {
+    using Lanes = typename Sums::Lanes;
+    Lanes sum = Sums::times(Sums::widened(input(box.first)), box.head);
+    if (box.first + 1 < box.last) {
+        Lanes between = Sums::widened(input(box.first + 1));
+        for (kelValue_s32 k = box.first + 2; k < box.last; ++k)
+            between = Sums::plus(between, Sums::widened(input(k)));
+        sum = Sums::plus(sum, Sums::times(between, ratio.repeat));
+    }
+    if (box.first < box.last)
+        sum = Sums::plus(sum, Sums::times(Sums::widened(input(box.last)), box.tail));
+    return Sums::average(sum, ratio.box);
 }
 
-// Two to one, the ratio of pyramids: (a + b) / 2 rounding down, four pixels at a time.
+// (a + b) / 2 rounding down, byte by byte.
 __m128i halfOfSum(__m128i a, __m128i b) {
     return _mm_sub_epi8(_mm_avg_epu8(a, b), _mm_and_si128(_mm_xor_si128(a, b), _mm_set1_epi8(1)));
 }
 
-void averageAcross(uint32_t* to, const uint32_t* from, const Ratio& ratio, const Division& division, kelValue_s32 width) {
+template <class Sums>
+void averageAcross(uint32_t* to, const uint32_t* from, const Ratio& ratio, const Box* boxes, kelValue_s32 width) {
     kelValue_s32 j = 0;
-    if (ratio.repeat == 1 && ratio.box == 2)
+    if (ratio.isHalf())
         for (; j + 4 <= width; j += 4) {
-            const __m128 low = _mm_loadu_ps(reinterpret_cast<const float*>(from + 2 * j));
-            const __m128 high = _mm_loadu_ps(reinterpret_cast<const float*>(from + 2 * j + 4));
-            const __m128i even = _mm_castps_si128(_mm_shuffle_ps(low, high, _MM_SHUFFLE(2, 0, 2, 0)));
-            const __m128i odd = _mm_castps_si128(_mm_shuffle_ps(low, high, _MM_SHUFFLE(3, 1, 3, 1)));
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(to + j), halfOfSum(even, odd));
+            const __m128i low = load(from + 2 * j), high = load(from + 2 * j + 4);
+            store(to + j, halfOfSum(everySecond<false>(low, high, Pixel<4>()), everySecond<true>(low, high, Pixel<4>())));
         }
-    for (; j < width; ++j) {
-        const Box box = ratio.at(j);
-        __m128i between = _mm_setzero_si128();
-        for (kelValue_s32 k = box.first + 1; k < box.last; ++k)
-            between = _mm_add_epi32(between, widened(from[k]));
-        const __m128i ends = _mm_add_epi32(times(widened(from[box.first]), box.head), times(widened(from[box.last]), box.tail));
-        to[j] = quotient(_mm_add_epi32(times(between, static_cast<kelValue_s32>(ratio.repeat)), ends), division);
-    }
+    for (; j < width; ++j)
+        to[j] = static_cast<uint32_t>(averageOf<Sums>(boxes[j], ratio, [=](kelValue_s32 k) { return uint64_t(from[k]); }));
 }
 
-// sums += factor * row, pixel by pixel.
-void accumulate(uint32_t* sums, const uint32_t* row, kelValue_s32 factor, kelValue_s32 width) {
-    const __m128i f = _mm_set1_epi32(factor);
-    for (kelValue_s32 x = 0; x < width; ++x) {
-        __m128i* const sum = reinterpret_cast<__m128i*>(sums + 4 * static_cast<ptrdiff_t>(x));
-        _mm_storeu_si128(sum, _mm_add_epi32(_mm_loadu_si128(sum), _mm_mullo_epi32(widened(row[x]), f)));
+// Averages rows of horizontally reduced pixels; rowAt(k) is such a row.
+template <class Sums, class RowAt>
+void averageDown(uint32_t* to, const Box& box, const Ratio& ratio, kelValue_s32 width, RowAt rowAt) {
+    kelValue_s32 x = 0;
+    if (ratio.isHalf())
+        for (const uint32_t *a = rowAt(box.first), *b = rowAt(box.last); x + 4 <= width; x += 4)
+            store(to + x, halfOfSum(load(a + x), load(b + x)));
+    for (; x + 2 <= width; x += 2) {
+        const uint64_t average = averageOf<Sums>(box, ratio, [=](kelValue_s32 k) {
+            uint64_t two;
+            memcpy(&two, rowAt(k) + x, sizeof two);
+            return two;
+        });
+        memcpy(to + x, &average, sizeof average);
+    }
+    if (x < width)
+        to[x] = static_cast<uint32_t>(averageOf<Sums>(box, ratio, [=](kelValue_s32 k) { return uint64_t(rowAt(k)[x]); }));
+}
+
+template <class AcrossSums, class DownSums>
+void reduce(kelImage_t* dst, const kelImage_t* src, const Ratio& across, const Ratio& down) {
+    const kelValue_s32 width = dst->width;
+    Buffer<Box> boxes = allocate<Box>(width);
+    for (kelValue_s32 x = 0; x < width; ++x)
+        boxes[x] = across.at(x);
+    // A ring of reduced rows, large enough for those under one box.
+    const kelValue_s32 rows = static_cast<kelValue_s32>((down.box + down.repeat - 1) / down.repeat + 1);
+    Buffer<uint32_t> ring = allocate<uint32_t>(static_cast<size_t>(rows) * width);
+    const auto rowAt = [&](kelValue_s32 k) { return ring.get() + static_cast<ptrdiff_t>(k % rows) * width; };
+    kelValue_s32 reduced = 0; // source rows that have passed through the ring
+    for (kelValue_s32 y = 0; y < dst->height; ++y) {
+        const Box box = down.at(y);
+        for (; reduced <= box.last; ++reduced)
+            averageAcross<AcrossSums>(rowAt(reduced), rowByWidth<uint32_t>(src, reduced), across, boxes.get(), width);
+        averageDown<DownSums>(rowByWidth<uint32_t>(dst, y), box, down, width, rowAt);
     }
 }
 
@@ -383,7 +457,7 @@ void resizeKelImageHalf(kelImage_t* dst, const kelImage_t* src) {
     kel::withPixel(dst->type, [=](auto pixel) {
         using P = decltype(pixel);
         for (kelValue_s32 y = 0; y < dst->height; ++y)
-            decimate<2>(row<P>(dst, y), row<P>(src, 2 * y), dst->width);
+            halveRow<false>(row<P>(dst, y), row<P>(src, 2 * y), dst->width);
     });
 }
 
@@ -409,27 +483,12 @@ void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
 
 void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src) {
     const Ratio across(dst->width, src->width), down(dst->height, src->height);
-    const Division byAcross(across.box), byDown(down.box);
-    Buffer<uint32_t> reduced = allocate<uint32_t>(dst->width), sums = allocate<uint32_t>(4 * static_cast<size_t>(dst->width));
-    kelValue_s32 held = -1; // the source row that `reduced` holds
-    const auto add = [&](kelValue_s32 y, kelValue_s32 factor) {
-        if (y != held)
-            averageAcross(reduced.get(), rowByWidth<uint32_t>(src, y), across, byAcross, dst->width);
-        held = y;
-        accumulate(sums.get(), reduced.get(), factor, dst->width);
-    };
-    for (kelValue_s32 y = 0; y < dst->height; ++y) {
-        const Box box = down.at(y);
-        memset(sums.get(), 0, 16 * static_cast<size_t>(dst->width));
-        add(box.first, box.head);
-        for (kelValue_s32 k = box.first + 1; k < box.last; ++k)
-            add(k, static_cast<kelValue_s32>(down.repeat));
-        if (box.last > box.first)
-            add(box.last, box.tail);
-        uint32_t* const to = rowByWidth<uint32_t>(dst, y);
-        for (kelValue_s32 x = 0; x < dst->width; ++x)
-            to[x] = quotient(_mm_loadu_si128(reinterpret_cast<const __m128i*>(sums.get()) + x), byDown);
-    }
+    if (across.box <= kWordBox)
+        down.box <= kWordBox ? reduce<WordSums, WordSums>(dst, src, across, down)
+                             : reduce<WordSums, LongSums>(dst, src, across, down);
+    else
+        down.box <= kWordBox ? reduce<LongSums, WordSums>(dst, src, across, down)
+                             : reduce<LongSums, LongSums>(dst, src, across, down);
 }
 
 void resizeKelImageEnborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size) {
