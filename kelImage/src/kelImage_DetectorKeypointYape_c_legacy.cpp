@@ -108,6 +108,23 @@ kelKeypoint2DF32_t keypointAt(const kelImage_t* laplacian, kelValue_s32 x, kelVa
     return {fine[0], fine[1], score, -1};
 }
 
+// The caller's record array and how much of it is written.
+struct Records {
+    kelKeypoint2DF32_t* array;
+    kelValue_s32 max, count;
+};
+
+// Kept out of the scan, whose loop needs the registers.
+__attribute__((noinline)) void consider(Records& records, const kelImage_t* gaussian, const kelImage_t* laplacian,
+                                        kelValue_s32 x, kelValue_s32 y) {
+    const int16_t* const response = kel::row<int16_t>(laplacian, y);
+    if (!isExtremum(response + x, laplacian->step) || !isExamined(response, x))
+        return;
+    const int strength = score(kel::row<uint8_t>(gaussian, y) + x, gaussian->step, response[x]);
+    if (strength >= kLeastScore && records.count < records.max)
+        records.array[records.count++] = keypointAt(laplacian, x, y, strength);
+}
+
 } // namespace
 
 extern "C" kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoints, kelValue_s32 max, kelImage_t* gaussian,
@@ -115,22 +132,21 @@ extern "C" kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoin
     KEL_ASSERT(gaussian->width == laplacian->width && gaussian->height == laplacian->height);
     if (gaussian->type != KEL_PIXEL_TYPE_U8G)
         return 0;
-    kelValue_s32 count = 0;
+    Records records{keypoints, max, 0};
     const kelValue_s32 end = gaussian->width - kBorder;
     for (kelValue_s32 y = kBorder; y < gaussian->height - kBorder; ++y) {
         const int16_t* const response = kel::row<int16_t>(laplacian, y);
-        for (kelValue_s32 block = kBorder; block < end; block += kBlock) {
-            // A block at the end of a row reads on into the rows below, of which there are enough.
+        // Blocks start on a multiple of 8; those at the end of a row read on into the rows below, of which there are enough.
+        for (kelValue_s32 block = kBorder - 1; block < end; block += kBlock) {
             unsigned mask = candidates(response + block, laplacian->step);
+            if (__builtin_expect(mask == 0, 1))
+                continue;
             for (; mask != 0; mask &= mask - 1) {
                 const kelValue_s32 x = block + __builtin_ctz(mask);
-                if (x >= end || !isExtremum(response + x, laplacian->step) || !isExamined(response, x))
-                    continue;
-                const int strength = score(kel::row<uint8_t>(gaussian, y) + x, gaussian->step, response[x]);
-                if (strength >= kLeastScore && count < max)
-                    keypoints[count++] = keypointAt(laplacian, x, y, strength);
+                if (x >= kBorder && x < end)
+                    consider(records, gaussian, laplacian, x, y);
             }
         }
     }
-    return count;
+    return records.count;
 }

@@ -53,7 +53,7 @@ TEST(Rank, LeavesAloneWhatItDoesNotHandle) {
 TEST(Noise, DrawsOncePerPixelInOrder) {
     for (int width : {1, 15, 16, 17, 40})
         for (int height : {1, 2, 9})
-            for (int amplitude : {1, 10, 255, 100000, -1, -7})
+            for (int amplitude : {1, 10, 255, 100000, -1, -7, INT32_MAX, INT32_MIN})
                 for (bool inPlace : {false, true}) {
                     Image src(width, height, KEL_PIXEL_TYPE_U8G), dst(width, height, KEL_PIXEL_TYPE_U8G);
                     Image expected(width, height, KEL_PIXEL_TYPE_U8G);

@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <kel/kelImage.h>
@@ -109,9 +110,9 @@ inline void rank(kelImage_t* dst, kelImage_t* src, int n) {
 inline void noise(kelImage_t* dst, kelImage_t* src, int amplitude) {
     for (int y = 0; y < src->height; ++y)
         for (int x = 0; x < src->width; ++x) {
-            int v = u8(src, x, y);
+            int64_t v = u8(src, x, y);
             if (amplitude != 0)
-                v += std::rand() % (2 * amplitude + 1) - amplitude;
+                v += std::rand() % (2 * int64_t(amplitude) + 1) - amplitude;
             u8(dst, x, y) = static_cast<uint8_t>(v < 0 ? 0 : v > 255 ? 255 : v);
         }
 }
