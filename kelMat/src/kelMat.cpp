@@ -174,19 +174,21 @@ kelMat kelMat::operator-(const kelMat& M) const {
 }
 
 kelMat kelMat::operator*(const kelMat& M) const {
+    kelMat R(0, 0, true);
     if (!bothCreated(*this, M))
-        return kelMat(0, 0, true);
+        return R;
     KEL_ASSERT(this->m_Width == M.m_Height);
-    kelMat R(m_Height, M.m_Width, false);
+    R.create(m_Height, M.m_Width, false);
     kel::multiply(R.m_Data, m_Data, M.m_Data, m_Height, m_Width, M.m_Width);
     return R;
 }
 
 kelMat kelMat::operator|(const kelMat& M) const {
+    kelMat R(0, 0, true);
     if (!bothCreated(*this, M))
-        return kelMat(0, 0, true);
+        return R;
     KEL_ASSERT(this->m_Height == M.m_Height);
-    kelMat R(m_Height, m_Width + M.m_Width, false);
+    R.create(m_Height, m_Width + M.m_Width, false);
     for (int r = 0; r < m_Height; ++r)
         std::copy_n(M[r], M.m_Width, std::copy_n((*this)[r], m_Width, R[r]));
     return R;
@@ -576,8 +578,8 @@ bool kelMat::getDecomposedMatrix_ART_3x3(kelMat& A, kelMat& R, kelMat& T) const 
 bool kelMat::getDecomposedMatrix_LU(kelMat& L, kelMat& U) const {
     KEL_ASSERT(this->m_Width == this->m_Height);
     const int n = m_Width;
-    kel::Scratch<int, 16> indx(n);
-    kel::LocalMat<16> both(*this);
+    kel::Scratch<int, kel::kSmallOrder> indx(n);
+    kel::SmallMat both(*this);
     float parity;
     const bool ok = nr_ludcmp(both, indx.data(), &parity);
     L.create(n, n, true);
@@ -599,7 +601,7 @@ bool kelMat::getDecomposedMatrix_SV(kelMat& U, kelMat& W, kelMat& V) const {
 }
 
 bool kelMat::getEigenValue(kelMat& d, kelMat& v) {
-    kel::LocalMat<144> copy(*this);
+    kel::SmallMat copy(*this);
     int rotations;
     nr_jacobi(copy, d, v, &rotations);
     return true;
@@ -608,15 +610,16 @@ bool kelMat::getEigenValue(kelMat& d, kelMat& v) {
 // With B = L L^T the problem becomes C y = lambda y, C = L^-1 A L^-T, and x = L^-T y.
 bool kelMat::getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X) {
     const kelMat& A = *this;
-    kelMat L(B);
+    kel::SmallMat L(B);
     nr_choldc(L);
-    const kelMat M = L.getTransposedMatrix().getInversedMatrix();
-    const kelMat N = M.getTransposedMatrix();
-    kelMat C = N * A * M;
-    kelMat Y;
+    kel::SmallMat U(L.m_Width, L.m_Height);
+    kel::transpose(U.m_Data, L.m_Data, L.m_Height, L.m_Width);
+    const kelMat M = U.getInversedMatrix(); // empty, as all that follows, where B has no factor with an inverse
+    kel::SmallMat N(M.m_Width, M.m_Height);
+    kel::transpose(N.m_Data, M.m_Data, M.m_Height, M.m_Width);
+    kelMat C = N * A * M, Y;
     int rotations;
     nr_jacobi(C, d, Y, &rotations);
-    X.create(A.m_Width, A.m_Width, true);
     X = M * Y;
     return true;
 }

@@ -74,7 +74,7 @@ float reduced(const kelMat& a, int i, int j, int count) {
 bool nr_ludcmp(kelMat& a, int* indx, float* d) {
     const int n = a.m_Width;
     *d = 1.0f;
-    kel::Scratch<float, 16> scales(n);
+    kel::Scratch<float, kel::kSmallOrder> scales(n);
     if (!rowScales(a, scales.data()))
         return false;
     int pivot = 0; // a column that has no candidate (all NaN) takes over the row of the column before
@@ -187,7 +187,7 @@ public:
 private:
     kelMat &u, &w, &v;
     const int m, n;
-    kel::Scratch<float, 16> e;
+    kel::Scratch<float, kel::kSmallOrder> e;
     float norm = 0.0f; // the largest |w| + |e|, the measure of what is negligible
 
     bool negligible(float x) const { return fabsf(x) + norm == norm; }
@@ -442,7 +442,7 @@ bool nr_jacobi(kelMat& a, kelMat& d, kelMat& v, int* nrot) {
     d.create(n, 1, true);
     v.create(n, n, false);
     v.setDataIdentity(1.0f);
-    kel::LocalMat<16> b(n, 1), z(n, 1);
+    kel::LocalMat<kel::kSmallOrder> b(n, 1), z(n, 1);
     z.setDataZero();
     for (int i = 0; i < n; ++i)
         b[i][0] = d[i][0] = a[i][i];

@@ -15,8 +15,8 @@ float kel_getDeterminant_3x3(const kelMat& A) {
 // A row of zeros leaves LU undone, with a zero on the diagonal all the same: no need to ask how it went.
 float kel_getDeterminant_NxN(const kelMat& A) {
     const int n = A.m_Width;
-    kel::Scratch<int, 16> indx(n);
-    kel::LocalMat<144> LU(A);
+    kel::Scratch<int, kel::kSmallOrder> indx(n);
+    kel::SmallMat LU(A);
     float det;
     nr_ludcmp(LU, indx.data(), &det);
     for (int i = 0; i < n; ++i)

@@ -31,13 +31,13 @@ bool kel_getInversedMatrix_3x3(const kelMat& A, kelMat& R) {
 
 bool kel_getInversedMatrix_NxN(const kelMat& A, kelMat& R) {
     const int n = A.m_Width;
-    kel::Scratch<int, 16> indx(n);
-    kel::LocalMat<144> LU(A);
+    kel::Scratch<int, kel::kSmallOrder> indx(n);
+    kel::SmallMat LU(A);
     float parity;
     if (!nr_ludcmp(LU, indx.data(), &parity))
         return false;
     R.create(n, n, false);
-    kel::Scratch<float, 16> column(n);
+    kel::Scratch<float, kel::kSmallOrder> column(n);
     for (int j = 0; j < n; ++j) {
         std::fill_n(column.data(), n, 0.0f);
         column[j] = 1.0f;
@@ -49,10 +49,14 @@ bool kel_getInversedMatrix_NxN(const kelMat& A, kelMat& R) {
 }
 
 bool kel_getInversedMatrix_NxM(const kelMat& A, kelMat& R) {
+    const int m = A.m_Height, n = A.m_Width;
     const kelMat T = A.getTransposedMatrix();
+    kel::SmallMat P(n, n);
+    kel::multiply(P.m_Data, T.m_Data, A.m_Data, n, m, n);
     kelMat Q;
-    const bool ok = (T * A).getInversedMatrix(Q);
-    if (ok)
-        R = Q * T;
-    return ok;
+    if (!P.getInversedMatrix(Q))
+        return false;
+    R.create(n, m, false);
+    kel::multiply(R.m_Data, Q.m_Data, T.m_Data, n, n, m);
+    return true;
 }

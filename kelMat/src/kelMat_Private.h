@@ -57,6 +57,10 @@ private:
     float m_inside[N];
 };
 
+// Orders up to which temporaries stay on the stack: those of the estimators, 12 at most.
+constexpr int kSmallOrder = 12;
+using SmallMat = LocalMat<kSmallOrder * kSmallOrder>;
+
 // R = A B, A (rows x inner) and B (inner x columns) row by row without gaps, apart from R. Every element sums over `inner` in
 // increasing order, from 0.
 void multiply(float* R, const float* A, const float* B, int rows, int inner, int columns);
