@@ -1,5 +1,4 @@
 // Registers two pictures: finds the homography from the first to the second and shows what it found.
-#include <CLI/CLI.hpp>
 #include <algorithm>
 #include <chrono>
 #include <cmath>
@@ -7,6 +6,7 @@
 #include <iostream>
 
 #include "common/Draw.h"
+#include "common/Program.h"
 #include "common/Registration.h"
 #include "common/Scene.h"
 
@@ -14,7 +14,7 @@ using namespace kel_examples;
 
 namespace {
 
-constexpr int kMostFeatures = 1600;
+constexpr int kMostFeatures = 1200;
 
 struct Options {
     std::vector<std::string> pictures;
@@ -67,7 +67,10 @@ void writePictures(const Image& first, const Image& second, const Result& r, con
     makeFolder(folder);
     writePicture(folder + "/keypoints.png", drawKeypoints(first, second, r.first, r.second));
     writePicture(folder + "/matches.png", drawMatches(first, second, r.first, r.second, r.matches, r.registration.inlier));
-    if (r.registration.H.m_IsCreated) {
+    if (!r.registration.H.m_IsCreated) { // pictures of an earlier run would mislead
+        std::remove((folder + "/warped.png").c_str());
+        std::remove((folder + "/mosaic.png").c_str());
+    } else {
         writePicture(folder + "/warped.png", warpPicture(first, r.registration.H, sizeOf(second)));
         writePicture(folder + "/mosaic.png", drawMosaic(first, second, r.registration.H));
     }
@@ -98,8 +101,9 @@ int registerPictures(const Options& options) {
     if (truth.m_IsCreated)
         std::printf("mean error against the truth: %.2f pixels\n",
                     static_cast<double>(meanError(r.registration.H, truth, sizeOf(first), sizeOf(second))));
-    if (options.pictures.empty() || options.output == "kel-out")
-        std::printf("pictures: %s/keypoints.png matches.png warped.png mosaic.png\n", options.output.c_str());
+    if (options.pictures.empty())
+        for (const char* name : {"keypoints", "matches", "warped", "mosaic"})
+            std::printf("wrote %s/%s.png\n", options.output.c_str(), name);
     return 0;
 }
 
@@ -119,17 +123,9 @@ int main(int argc, char** argv) {
         ->check(CLI::Range(0.1f, 100.0f))
         ->capture_default_str();
     app.add_option("--seed", options.seed, "of the random samples, and of the rendered scene")->capture_default_str();
-    try {
-        app.parse(argc, argv);
+    return runProgram(app, argc, argv, [&] {
         if (options.pictures.size() == 1)
-            throw CLI::ValidationError("pictures", "two are needed, FIRST and SECOND");
-    } catch (const CLI::ParseError& error) {
-        return app.exit(error) == 0 ? 0 : 1;
-    }
-    try {
+            throw Error("two pictures are needed, FIRST and SECOND");
         return registerPictures(options);
-    } catch (const std::exception& error) {
-        std::cerr << "register: " << error.what() << '\n';
-        return 1;
-    }
+    });
 }

@@ -10,8 +10,8 @@ namespace kel_examples {
 
 namespace {
 
-constexpr int kLeastInliers = 14;         // at different places
-constexpr float kLeastShare = 0.12f;      // of the matches
+constexpr int kLeastInliers = 12;         // at different places
+constexpr float kLeastShare = 0.10f;      // of the matches
 constexpr float kReverseAgreement = 6.0f; // pixels between there and back
 constexpr int kTries = 4;
 
