@@ -118,6 +118,19 @@ TEST(Yape, EqualsTheWalkAtEverySizeOnEveryKindOfResponse) {
     EXPECT_GT(tally.dropped, 100);
 }
 
+// Every pixel of a chessboard is beyond its direct neighbours; chance decides about the diagonal ones.
+TEST(Yape, EqualsTheWalkWhereEveryPixelIsACandidate) {
+    kel_ref::YapeTally tally;
+    Image gaussian(700, 24, KEL_PIXEL_TYPE_U8G), laplacian(700, 24, KEL_PIXEL_TYPE_S16G);
+    gaussian.fill(Fill::Runs, 1);
+    std::mt19937 random = kel_test::generator(2);
+    for (int y = 0; y < 24; ++y)
+        for (int x = 0; x < laplacian->step; ++x)
+            laplacian.at<int16_t>(x, y) = static_cast<int16_t>((x + y) % 2 ? 200 + random() % 90 : -200 - int(random() % 90));
+    ASSERT_TRUE(equalsReference(gaussian, laplacian, 5000, tally));
+    EXPECT_GT(tally.edge, 50);
+}
+
 TEST(Yape, EqualsTheWalkBehindTheFilters) {
     kel_ref::YapeTally tally;
     Image src(331, 240, KEL_PIXEL_TYPE_U8G), smooth(331, 240, KEL_PIXEL_TYPE_U8G), tmp(331, 240, KEL_PIXEL_TYPE_U8G);
