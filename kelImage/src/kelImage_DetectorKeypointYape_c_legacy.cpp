@@ -41,7 +41,8 @@ inline unsigned candidates(const int16_t* r, ptrdiff_t step) {
 // A candidate is beyond its four direct neighbours already; an extremum is beyond the diagonal ones, too.
 bool isExtremum(const int16_t* r, ptrdiff_t step) {
     const int here = *r, a = r[-step - 1], b = r[-step + 1], c = r[step - 1], d = r[step + 1];
-    return here > 0 ? here > a && here > b && here > c && here > d : here < a && here < b && here < c && here < d;
+    const bool peak = here > std::max({a, b, c, d}), pit = here < std::min({a, b, c, d});
+    return (peak & (here > 0)) | (pit & (here < 0));
 }
 
 // The scan starts at kBorder, and after a weak column it steps over the next one: an extremum there is missed, and callers
@@ -108,22 +109,58 @@ kelKeypoint2DF32_t keypointAt(const kelImage_t* laplacian, kelValue_s32 x, kelVa
     return {fine[0], fine[1], score, -1};
 }
 
-// The caller's record array and how much of it is written.
-struct Records {
-    kelKeypoint2DF32_t* array;
-    kelValue_s32 max, count;
-};
+// The scan of one pair of images: what it reads, where its records go, and the candidates of a row that are still to be judged.
+class Scan {
+public:
+    Scan(const kelImage_t* gaussian, const kelImage_t* laplacian, kelKeypoint2DF32_t* keypoints, kelValue_s32 max)
+        : m_gaussian(gaussian), m_laplacian(laplacian), m_keypoints(keypoints), m_max(max) {}
 
-// Kept out of the scan, whose loop needs the registers.
-__attribute__((noinline)) void consider(Records& records, const kelImage_t* gaussian, const kelImage_t* laplacian,
-                                        kelValue_s32 x, kelValue_s32 y) {
-    const int16_t* const response = kel::row<int16_t>(laplacian, y);
-    if (!isExtremum(response + x, laplacian->step) || !isExamined(response, x))
-        return;
-    const int strength = score(kel::row<uint8_t>(gaussian, y) + x, gaussian->step, response[x]);
-    if (strength >= kLeastScore && records.count < records.max)
-        records.array[records.count++] = keypointAt(laplacian, x, y, strength);
-}
+    // Blocks start on a multiple of 8; those at the end of a row read on into the rows below, of which there are enough.
+    void row(kelValue_s32 y) {
+        const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
+        const kelValue_s32 end = m_laplacian->width - kBorder;
+        for (kelValue_s32 block = kBorder - 1; block < end; block += kBlock) {
+            unsigned mask = candidates(response + block, m_laplacian->step);
+            for (; mask != 0; mask &= mask - 1) {
+                const kelValue_s32 x = block + __builtin_ctz(mask);
+                m_columns[m_pending] = x;
+                m_pending += x >= kBorder && x < end;
+            }
+            if (m_pending > kCapacity - kBlock)
+                judge(y);
+        }
+        judge(y);
+    }
+    kelValue_s32 count() const { return m_count; }
+
+private:
+    // Most candidates fail and none can be predicted, so the failing ones are overwritten instead of branched around.
+    __attribute__((noinline)) void judge(kelValue_s32 y) {
+        const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
+        const uint8_t* const grey = kel::row<uint8_t>(m_gaussian, y);
+        int kept = 0, strengths[kCapacity];
+        for (int i = 0; i < m_pending; ++i) {
+            const kelValue_s32 x = m_columns[i];
+            const int strength = score(grey + x, m_gaussian->step, response[x]);
+            m_columns[kept] = x;
+            strengths[kept] = strength;
+            kept += (strength >= kLeastScore) & isExtremum(response + x, m_laplacian->step);
+        }
+        m_pending = 0;
+        for (int i = 0; i < kept; ++i)
+            if (isExamined(response, m_columns[i]) && m_count < m_max)
+                m_keypoints[m_count++] = keypointAt(m_laplacian, m_columns[i], y, strengths[i]);
+    }
+
+    static constexpr int kCapacity = 128;
+    const kelImage_t* const m_gaussian;
+    const kelImage_t* const m_laplacian;
+    kelKeypoint2DF32_t* const m_keypoints;
+    const kelValue_s32 m_max;
+    kelValue_s32 m_count = 0;
+    int m_pending = 0;
+    kelValue_s32 m_columns[kCapacity];
+};
 
 } // namespace
 
@@ -132,21 +169,8 @@ extern "C" kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoin
     KEL_ASSERT(gaussian->width == laplacian->width && gaussian->height == laplacian->height);
     if (gaussian->type != KEL_PIXEL_TYPE_U8G)
         return 0;
-    Records records{keypoints, max, 0};
-    const kelValue_s32 end = gaussian->width - kBorder;
-    for (kelValue_s32 y = kBorder; y < gaussian->height - kBorder; ++y) {
-        const int16_t* const response = kel::row<int16_t>(laplacian, y);
-        // Blocks start on a multiple of 8; those at the end of a row read on into the rows below, of which there are enough.
-        for (kelValue_s32 block = kBorder - 1; block < end; block += kBlock) {
-            unsigned mask = candidates(response + block, laplacian->step);
-            if (__builtin_expect(mask == 0, 1))
-                continue;
-            for (; mask != 0; mask &= mask - 1) {
-                const kelValue_s32 x = block + __builtin_ctz(mask);
-                if (x >= kBorder && x < end)
-                    consider(records, gaussian, laplacian, x, y);
-            }
-        }
-    }
-    return records.count;
+    Scan scan(gaussian, laplacian, keypoints, max);
+    for (kelValue_s32 y = kBorder; y < gaussian->height - kBorder; ++y)
+        scan.row(y);
+    return scan.count();
 }

@@ -118,6 +118,19 @@ TEST(Yape, EqualsTheWalkAtEverySizeOnEveryKindOfResponse) {
     EXPECT_GT(tally.dropped, 100);
 }
 
+// Every pixel of a chessboard is beyond its direct neighbours; chance decides about the diagonal ones.
+TEST(Yape, EqualsTheWalkWhereEveryPixelIsACandidate) {
+    kel_ref::YapeTally tally;
+    Image gaussian(700, 24, KEL_PIXEL_TYPE_U8G), laplacian(700, 24, KEL_PIXEL_TYPE_S16G);
+    gaussian.fill(Fill::Runs, 1);
+    std::mt19937 random = kel_test::generator(2);
+    for (int y = 0; y < 24; ++y)
+        for (int x = 0; x < laplacian->step; ++x)
+            laplacian.at<int16_t>(x, y) = static_cast<int16_t>((x + y) % 2 ? 200 + random() % 90 : -200 - int(random() % 90));
+    ASSERT_TRUE(equalsReference(gaussian, laplacian, 5000, tally));
+    EXPECT_GT(tally.edge, 50);
+}
+
 TEST(Yape, EqualsTheWalkBehindTheFilters) {
     kel_ref::YapeTally tally;
     Image src(331, 240, KEL_PIXEL_TYPE_U8G), smooth(331, 240, KEL_PIXEL_TYPE_U8G), tmp(331, 240, KEL_PIXEL_TYPE_U8G);
@@ -208,15 +221,29 @@ TEST(Yape, RefinesToTheExtremumOfTheQuadratic) {
     }
 }
 
-// At (30, 20) dx = dy = 12, dxx = dyy = -36, dxy = 28: the first step is (1.5, 1.5), which moves on to (31, 21). There
-// dx = dy = 1, dxx = dyy = -8, dxy = 0: the last step is (0.125, 0.125), and it counts from (30, 20).
+// With the peak at (x, y) dx = dy = 12, dxx = dyy = -36, dxy = 28: the first step is (1.5, 1.5), which moves on to
+// (x+1, y+1). There dx = dy = 1, dxx = dyy = -8, dxy = 0: the last step is (0.125, 0.125), and it counts from (x, y). A move
+// that enters the border ends the refinement without an offset.
 TEST(Yape, AddsTheLastStepToThePixelWhereItStarted) {
-    Frame frame(60, 40);
     const int16_t around[4][4] = {{199, 170, 143, 0}, {170, 200, 194, 150}, {143, 194, 199, 196}, {0, 150, 196, 100}};
-    for (int v = 0; v < 4; ++v)
-        for (int u = 0; u < 4; ++u)
-            frame.response(29 + u, 19 + v) = around[v][u];
-    EXPECT_TRUE(sameBits(frame.keypoints(), {{30.125f, 20.125f, 200, -1}}));
+    struct {
+        int x, y, toRight, toBottom; // 1 or -1
+        bool leaves;
+    } const cases[] = {
+        {30, 20, 1, 1, false}, {30, 20, -1, 1, false}, {30, 20, 1, -1, false}, {49, 20, 1, 1, false},
+        {50, 20, 1, 1, true},  {11, 20, -1, 1, false}, {10, 20, -1, 1, true},  {30, 29, 1, 1, false},
+        {30, 30, 1, 1, true},  {30, 11, 1, -1, false}, {30, 10, 1, -1, true},
+    };
+    for (const auto& c : cases) {
+        Frame frame(60, 40);
+        for (int v = 0; v < 4; ++v)
+            for (int u = 0; u < 4; ++u)
+                frame.response(c.x + c.toRight * (u - 1), c.y + c.toBottom * (v - 1)) = around[v][u];
+        const float offset = c.leaves ? 0 : 0.125f, x = static_cast<float>(c.x), y = static_cast<float>(c.y);
+        const Keypoints expected{
+            {x + offset * static_cast<float>(c.toRight), y + offset * static_cast<float>(c.toBottom), 200, -1}};
+        EXPECT_TRUE(sameBits(frame.keypoints(), expected)) << c.x << ", " << c.y;
+    }
 }
 
 TEST(Yape, KeepsTheFirstInScanOrder) {
