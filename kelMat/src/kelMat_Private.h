@@ -3,6 +3,7 @@
 #ifndef KEL_MAT_PRIVATE_H
 #define KEL_MAT_PRIVATE_H
 
+#include <cmath>
 #include <cstddef>
 #include <cstdlib>
 
@@ -25,7 +26,7 @@ public:
     T& operator[](ptrdiff_t i) { return m_data[i]; }
 
 private:
-    T m_inside[N];
+    alignas(16) T m_inside[N];
     T* m_data;
 };
 
@@ -54,12 +55,26 @@ public:
     LocalMat& operator=(const LocalMat&) = delete;
 
 private:
-    float m_inside[N];
+    alignas(16) float m_inside[N];
 };
 
 // Orders up to which temporaries stay on the stack: those of the estimators, 12 at most.
 constexpr int kSmallOrder = 12;
 using SmallMat = LocalMat<kSmallOrder * kSmallOrder>;
+
+inline float sign(float x) {
+    return x >= 0.0f ? 1.0f : -1.0f;
+}
+
+// The longer of the two times a root in double.
+inline float pythag(float a, float b) {
+    const float A = std::fabs(a), B = std::fabs(b);
+    const float longer = A > B ? A : B, shorter = A > B ? B : A;
+    if (longer == 0.0f)
+        return 0.0f;
+    const float ratio = shorter / longer, q = ratio * ratio + 1.0f;
+    return static_cast<float>(static_cast<double>(longer) * std::sqrt(static_cast<double>(q)));
+}
 
 // R = A B, A (rows x inner) and B (inner x columns) row by row without gaps, apart from R. Every element sums over `inner` in
 // increasing order, from 0.
@@ -67,6 +82,11 @@ void multiply(float* R, const float* A, const float* B, int rows, int inner, int
 
 // T = the transpose of A (rows x columns), apart from A.
 void transpose(float* T, const float* A, int rows, int columns);
+
+// Singular value decomposition of a, which has the size of u and is u.m_Data itself or apart from it. Creates w and v, n x n.
+// With `withU` u becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs less than
+// half, and w and v have the same bits. False where a value does not converge.
+bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v);
 
 } // namespace kel
 
