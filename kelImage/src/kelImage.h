@@ -495,27 +495,105 @@ KEL_API kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoints,
  * Resizing and borders
  * ---------------------------------------------------------------------------------------------------------------- */
 
-/** Checks the types and resizes nothing. */
+/*
+ * Types: U8G, S16G, U8XYZ, U8ZYX, U8XYZA, U8ZYXA, moved as whole pixels, unless a function names fewer. Source and
+ * destination must be different images. Row padding stays untouched where rows are addressed by `step`.
+ *
+ * resizeKelImageNearest(), resizeKelImageBilinear(), resizeLinerInterpolation() and zero_order_hold_plus_ave() address
+ * pixel (x, y) of either image at element y * width + x of its data, as if rows were densely packed: pictures come out as
+ * expected where widths are multiples of 16.
+ */
+
+/** Checks the types and resizes nothing. Stops the process on "dst->type == src->type". */
 KEL_API void resizeKelImage(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * Nearest sample at whole-number ratios: dst(x, y) = src(trunc((x + 0.5) rx), trunc((y + 0.5) ry)) with rx = src->width /
+ * dst->width and ry = src->height / dst->height, integer divisions. An enlargement has ratio 0 and repeats pixel
+ * (0, 0). Rows by `width`, see above. A destination without width or height divides by zero.
+ * Stops the process on "dst->type == src->type".
+ */
 KEL_API void resizeKelImageNearest(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * Bilinear sample of a U8G image at whole-number ratios, at the positions of resizeKelImageNearest() before truncation,
+ * rounded half up: even ratios pick one pixel, odd ones average the four from ((x + 0.5) rx, (y + 0.5) ry) on. The neighbour
+ * of the last column or row is itself. Rows by `width`, see above. A destination without width or height divides by zero,
+ * before the check. Other types are ignored. Stops the process on "dst->type == src->type".
+ */
 KEL_API void resizeKelImageBilinear(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * Keeps the top-left pixel of every 2x2 block, without averaging: dst(x, y) = src(2x, 2y). Rows by `step`.
+ * Stops the process on "dst->type == src->type", "dst->width == src->width / 2" and "dst->height == src->height / 2".
+ */
 KEL_API void resizeKelImageHalf(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * Linear enlargement of four-byte pixels at any ratio, first along rows, then along columns, each step with weights
+ * in 1/256 and truncation; destination x lies at source x * src->width / dst->width. The fourth channel of the result is 0.
+ *
+ * For destinations at least as wide and high as the source. Rows by `width`, see above. THE PIXEL BEHIND THE SOURCE'S
+ * LAST IS READ, and takes part in the last columns, as does the next row's first pixel in every other row. Nothing
+ * is checked, the types neither.
+ */
 KEL_API void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * Reduction of four-byte pixels at any ratio by repeating, then averaging: along rows every pixel is repeated a times and every b
+ * of those are averaged, a / b = dst->width / src->width in lowest terms; then the same along columns. Each step rounds down. All
+ * four channels alike.
+ *
+ * For destinations not wider than the source. Rows by `width`, see above. Nothing is checked, the types neither.
+ */
 KEL_API void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src);
+
+/**
+ * Adds a border of `size` pixels (0 or more) on every side that repeats the nearest pixel of the source.
+ *
+ * U8G and S16G address rows by `step`, types of three and four bytes by `width` (densely packed). For S16G the right border
+ * starts at column src->step + size and repeats column src->step + size - 1: with a source width that is no multiple of 16 the
+ * true right border stays as it was and the band lands further on in memory, never beyond dst->size bytes.
+ * Stops the process on "dst->type == src->type" and
+ * "dst->width == src->width +2*size && dst->height == src->height + 2*size".
+ */
 KEL_API void resizeKelImageEnborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size);
+
+/**
+ * Crops a border of `size` pixels: dst(x, y) = src(x + size, y + size). Rows by `step`.
+ * Stops the process on "dst->type == src->type" and
+ * "dst->width == src->width - 2*size && dst->height == src->height - 2*size".
+ */
 KEL_API void resizeKelImageDeborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size);
 
 /* ------------------------------------------------------------------------------------------------------------------
  * Flips and warp
  * ---------------------------------------------------------------------------------------------------------------- */
 
-/** dst(x, y) = src(W-1-x, y). */
+/*
+ * Types: U8G, S16G, U8XYZ, U8ZYX, U8XYZA, U8ZYXA, moved as whole pixels; others are ignored. Rows by `step`, padding untouched.
+ * Source and destination must be different images. The flips stop the process on "dst->type == src->type" and
+ * "dst->width == src->width && dst->height == src->height", the warp on the first only.
+ */
+
+/** Mirror: dst(x, y) = src(W-1-x, y). */
 KEL_API void rotateKelImageH(kelImage_t* dst, const kelImage_t* src);
-/** dst(x, y) = src(x, H-1-y). */
+/** Flip upside down: dst(x, y) = src(x, H-1-y). */
 KEL_API void rotateKelImageV(kelImage_t* dst, const kelImage_t* src);
-/** dst(x, y) = src(W-1-x, H-1-y). */
+/** Half turn: dst(x, y) = src(W-1-x, H-1-y). */
 KEL_API void rotateKelImageVH(kelImage_t* dst, const kelImage_t* src);
-/** Projective warp by the homography that maps destination to source. */
+
+/**
+ * Projective warp, nearest sample, zero (in every byte) where nothing maps to. The homography [h0 h1 h2; h3 h4 h5; h6 h7 h8] takes
+ * DESTINATION coordinates to SOURCE coordinates: pass the inverse of the transform that the picture should undergo.
+ * The images may differ in size.
+ *
+ * With w = h6 u + h7 v + h8, qx = (h0 u + h1 v + h2) / w and qy = (h3 u + h4 v + h5) / w, in single precision:
+ *  - U8G goes through pixel centres: (u, v) = (x + 0.5, y + 0.5), source pixel (trunc(qx), trunc(qy));
+ *  - other types go through pixel corners: (u, v) = (x, y), source pixel (trunc(qx + 0.5), trunc(qy + 0.5)).
+ * Truncation is toward zero, so that quotients in (-1, 0) count as pixel 0. Quotients that are not finite or that no int holds give
+ * zero pixels.
+ */
 KEL_API void rotateKelImageHomography(kelImage_t* dst, const kelImage_t* src, float h0, float h1, float h2, float h3, float h4,
                                       float h5, float h6, float h7, float h8);
 

@@ -1,0 +1,669 @@
+// The matrix class: storage, arithmetic, points, rotations, decompositions. The iterative kernels are in kelMatAlgorithm.cpp,
+// determinants and inverses in files of their own.
+#include <algorithm>
+#include <emmintrin.h>
+#include <math.h>
+#include <stdio.h>
+#include <stdlib.h>
+
+#include "kelAssert.h"
+#include "kelMat_Private.h"
+
+namespace {
+
+size_t elements(const kelMat& M) {
+    return static_cast<size_t>(M.m_Height) * static_cast<size_t>(M.m_Width);
+}
+
+} // namespace
+
+// ---- storage ---------------------------------------------------------------------------------------------------------------
+
+kelMat::kelMat(int height, int width, bool zero) : m_IsCreated(false), m_Data(nullptr) {
+    create(height, width, zero);
+}
+
+kelMat::kelMat(const kelMat& M) : m_IsCreated(false), m_Data(nullptr) {
+    create(M.m_Height, M.m_Width, false);
+    std::copy_n(M.m_Data, elements(M), m_Data);
+}
+
+kelMat::~kelMat() {
+    release();
+}
+
+float* kelMat::create(int height, int width, bool zero) {
+    release();
+    if (width > 0 && height > 0) {
+        m_Height = height;
+        m_Width = width;
+        m_Data = static_cast<float*>(malloc(elements(*this) * sizeof(float)));
+        m_IsCreated = true;
+        if (zero)
+            setDataZero();
+    }
+    return m_Data;
+}
+
+void kelMat::release() {
+    if (m_Data)
+        free(m_Data);
+    m_Width = 0;
+    m_Height = 0;
+    m_Data = nullptr;
+    m_IsCreated = false;
+}
+
+void kelMat::resize(int height, int width, bool zero) {
+    kelMat before(*this);
+    create(height, width, zero);
+    setData(before);
+}
+
+kelMat& kelMat::operator=(const kelMat& M) {
+    create(M.m_Height, M.m_Width, false);
+    std::copy_n(M.m_Data, elements(M), m_Data);
+    return *this;
+}
+
+// ---- elements --------------------------------------------------------------------------------------------------------------
+
+float* kelMat::operator[](int row) const {
+    return m_Data + static_cast<ptrdiff_t>(row) * m_Width;
+}
+
+void kelMat::setData(int y, int x, float value) {
+    KEL_ASSERT(0<=x && x<this->m_Width && 0<=y && y<this->m_Height);
+    (*this)[y][x] = value;
+}
+
+void kelMat::setData(float* src) {
+    std::copy_n(src, elements(*this), m_Data);
+}
+
+void kelMat::setData(float** src) {
+    for (int r = 0; r < m_Height; ++r)
+        std::copy_n(src[r], m_Width, (*this)[r]);
+}
+
+void kelMat::setData(kelMat& M2) {
+    const int height = std::min(m_Height, M2.m_Height), width = std::min(m_Width, M2.m_Width);
+    for (int r = 0; r < height; ++r)
+        std::copy_n(M2[r], width, (*this)[r]);
+}
+
+void kelMat::setDataZero() {
+    std::fill_n(m_Data, elements(*this), 0.0f);
+}
+
+void kelMat::setDataIdentity(float value) {
+    setDataZero();
+    for (int i = 0; i < std::min(m_Height, m_Width); ++i)
+        (*this)[i][i] = value;
+}
+
+void kelMat::setDataUnitize() {
+    if (!m_IsCreated)
+        return;
+    const size_t n = elements(*this);
+    const float s = 1.0f / m_Data[n - 1];
+    for (size_t i = 0; i < n; ++i)
+        m_Data[i] *= s;
+}
+
+void kelMat::print(const char* name) {
+    if (name)
+        printf("<mat name=\"%s\">\n", name);
+    else
+        puts("<mat>");
+    for (int r = 0; r < m_Height; ++r) {
+        for (int c = 0; c < m_Width; ++c)
+            printf("%8.3f ", static_cast<double>((*this)[r][c]));
+        putchar('\n');
+    }
+    puts("</mat>");
+}
+
+// ---- arithmetic ------------------------------------------------------------------------------------------------------------
+
+namespace {
+
+// A matrix of M's size with f(i) as its i-th element in storage order.
+template <class F> kelMat elementwise(const kelMat& M, F f) {
+    kelMat R(M.m_Height, M.m_Width, false);
+    float* const r = R.m_Data;
+    for (size_t i = 0, n = elements(M); i < n; ++i)
+        r[i] = f(i);
+    return R;
+}
+
+bool bothCreated(const kelMat& A, const kelMat& B) {
+    return A.m_IsCreated && B.m_IsCreated;
+}
+
+} // namespace
+
+kelMat kelMat::operator+(float v) const {
+    return elementwise(*this, [=](size_t i) { return m_Data[i] + v; });
+}
+
+kelMat kelMat::operator-(float v) const {
+    return elementwise(*this, [=](size_t i) { return m_Data[i] - v; });
+}
+
+kelMat kelMat::operator*(float v) const {
+    return elementwise(*this, [=](size_t i) { return m_Data[i] * v; });
+}
+
+kelMat kelMat::operator/(float v) const {
+    return *this * (1.0f / v); // callers rely on the reciprocal: a true division differs in the last bit
+}
+
+kelMat kelMat::operator+(const kelMat& M) const {
+    if (!bothCreated(*this, M))
+        return kelMat(0, 0, true);
+    KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
+    return elementwise(*this, [&](size_t i) { return m_Data[i] + M.m_Data[i]; });
+}
+
+kelMat kelMat::operator-(const kelMat& M) const {
+    if (!bothCreated(*this, M))
+        return kelMat(0, 0, true);
+    KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
+    return elementwise(*this, [&](size_t i) { return m_Data[i] - M.m_Data[i]; });
+}
+
+kelMat kelMat::operator*(const kelMat& M) const {
+    kelMat R(0, 0, true);
+    if (!bothCreated(*this, M))
+        return R;
+    KEL_ASSERT(this->m_Width == M.m_Height);
+    R.create(m_Height, M.m_Width, false);
+    kel::multiply(R.m_Data, m_Data, M.m_Data, m_Height, m_Width, M.m_Width);
+    return R;
+}
+
+kelMat kelMat::operator|(const kelMat& M) const {
+    kelMat R(0, 0, true);
+    if (!bothCreated(*this, M))
+        return R;
+    KEL_ASSERT(this->m_Height == M.m_Height);
+    R.create(m_Height, m_Width + M.m_Width, false);
+    for (int r = 0; r < m_Height; ++r)
+        std::copy_n(M[r], M.m_Width, std::copy_n((*this)[r], m_Width, R[r]));
+    return R;
+}
+
+float kelMat::operator,(const kelMat&M) const {
+    KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
+    float sum = 0.0f;
+    for (size_t i = 0, n = elements(M); i < n; ++i)
+        sum += m_Data[i] * M.m_Data[i];
+    return sum;
+}
+
+bool kelMat::getTransposedMatrix(kelMat& T) const {
+    T.create(m_Width, m_Height, false);
+    kel::transpose(T.m_Data, m_Data, m_Height, m_Width);
+    return true;
+}
+
+kelMat kelMat::getTransposedMatrix() const {
+    kelMat T(0, 0, true);
+    getTransposedMatrix(T);
+    return T;
+}
+
+float kelMat::getNorm() const {
+    float sum = 0.0f;
+    for (size_t i = 0, n = elements(*this); i < n; ++i)
+        sum += m_Data[i] * m_Data[i];
+    return sqrtf(sum);
+}
+
+float kelMat::getTrace() const {
+    KEL_ASSERT(this->m_Height == this->m_Width);
+    float sum = 0.0f; // of squares: callers rely on the length of the diagonal, not on its sum
+    for (int i = 0; i < m_Width; ++i)
+        sum += (*this)[i][i] * (*this)[i][i];
+    return sqrtf(sum);
+}
+
+// ---- points ----------------------------------------------------------------------------------------------------------------
+
+namespace {
+
+float rowTimes(const float* row, float x, float y) {
+    return (x * row[0] + y * row[1]) + row[2];
+}
+
+float rowTimes(const float* row, float x, float y, float z) {
+    return ((x * row[0] + y * row[1]) + z * row[2]) + row[3];
+}
+
+// Halves up, but negative values toward zero (-1.7 gives -1); callers rely on it. Beyond the range of int: INT_MIN.
+int rounded(float f) {
+    return _mm_cvttsd_si32(_mm_set_sd(static_cast<double>(f) + 0.5));
+}
+
+} // namespace
+
+void kelMat::cvtPoint(float x, float y, float* u, float* v) {
+    KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
+    const kelMat& M = *this;
+    const float s = 1.0f / rowTimes(M[2], x, y);
+    *u = rowTimes(M[0], x, y) * s;
+    *v = rowTimes(M[1], x, y) * s;
+}
+
+void kelMat::cvtPoint(float x, float y, float z, float* u, float* v) {
+    KEL_ASSERT(this->m_Width == 4 && this->m_Height == 3);
+    const kelMat& M = *this;
+    const float s = 1.0f / rowTimes(M[2], x, y, z);
+    *u = rowTimes(M[0], x, y, z) * s;
+    *v = rowTimes(M[1], x, y, z) * s;
+}
+
+void kelMat::cvtPoint(float x, float y, float z, float* X, float* Y, float* Z) {
+    KEL_ASSERT(this->m_Width == 4 && this->m_Height == 4);
+    const kelMat& M = *this;
+    const float s = 1.0f / rowTimes(M[3], x, y, z);
+    *X = rowTimes(M[0], x, y, z) * s;
+    *Y = rowTimes(M[1], x, y, z) * s;
+    *Z = rowTimes(M[2], x, y, z) * s;
+}
+
+void kelMat::cvtPoint(int x, int y, int* u, int* v) {
+    float fu, fv;
+    cvtPoint(static_cast<float>(x), static_cast<float>(y), &fu, &fv);
+    *u = rounded(fu);
+    *v = rounded(fv);
+}
+
+void kelMat::cvtPoint(int x, int y, int z, int* u, int* v) {
+    float fu, fv;
+    cvtPoint(static_cast<float>(x), static_cast<float>(y), static_cast<float>(z), &fu, &fv);
+    *u = rounded(fu);
+    *v = rounded(fv);
+}
+
+void kelMat::cvtPoint(int x, int y, int z, int* X, int* Y, int* Z) {
+    float fX, fY, fZ;
+    cvtPoint(static_cast<float>(x), static_cast<float>(y), static_cast<float>(z), &fX, &fY, &fZ);
+    *X = rounded(fX);
+    *Y = rounded(fY);
+    *Z = rounded(fZ);
+}
+
+// ---- builders --------------------------------------------------------------------------------------------------------------
+
+namespace {
+
+constexpr float kPi = 3.1415927f;
+constexpr float kHalfPi = 1.5707964f;
+
+struct SineCosine {
+    float s, c;
+    explicit SineCosine(float degrees) { sincosf(degrees * kPi / 180.0f, &s, &c); }
+};
+
+float degrees(float radians) {
+    return radians * 180.0f / kPi;
+}
+
+void fill3x3(kelMat& M, float m00, float m01, float m02, float m10, float m11, float m12, float m20, float m21, float m22) {
+    const float values[] = {m00, m01, m02, m10, m11, m12, m20, m21, m22};
+    M.create(3, 3, false);
+    std::copy_n(values, 9, M.m_Data);
+}
+
+} // namespace
+
+void kelMat::setDataRotationMatrix_X_3x3(float a) {
+    const SineCosine A(a);
+    fill3x3(*this, 1.0f, 0.0f, 0.0f, //
+            0.0f, A.c, -A.s,         //
+            0.0f, A.s, A.c);
+}
+
+void kelMat::setDataRotationMatrix_Y_3x3(float a) {
+    const SineCosine A(a);
+    fill3x3(*this, A.c, 0.0f, A.s, //
+            0.0f, 1.0f, 0.0f,      //
+            -A.s, 0.0f, A.c);
+}
+
+void kelMat::setDataRotationMatrix_Z_3x3(float a) {
+    const SineCosine A(a);
+    fill3x3(*this, A.c, -A.s, 0.0f, //
+            A.s, A.c, 0.0f,         //
+            0.0f, 0.0f, 1.0f);
+}
+
+void kelMat::setDataRotationMatrix_XYZ_3x3(float x, float y, float z) {
+    const SineCosine X(x), Y(y), Z(z);
+    const float czsy = Z.c * Y.s, szsy = Z.s * Y.s;
+    fill3x3(*this, Z.c * Y.c, X.s * czsy - Z.s * X.c, czsy * X.c + Z.s * X.s, //
+            Z.s * Y.c, X.s * szsy + Z.c * X.c, szsy * X.c - Z.c * X.s,        //
+            -Y.s, Y.c * X.s, Y.c * X.c);
+}
+
+void kelMat::setDataRotationMatrix_ZYX_3x3(float x, float y, float z) {
+    const SineCosine X(x), Y(y), Z(z);
+    const float sxsy = X.s * Y.s, cxsy = X.c * Y.s;
+    fill3x3(*this, Y.c * Z.c, -Y.c * Z.s, Y.s,                          //
+            X.c * Z.s + Z.c * sxsy, X.c * Z.c - sxsy * Z.s, -X.s * Y.c, //
+            X.s * Z.s - Z.c * cxsy, X.s * Z.c + cxsy * Z.s, X.c * Y.c);
+}
+
+namespace {
+
+// Rz(last) Ry(tilt) Rz(first).
+void fillZYZ(kelMat& M, float st, float ct, float sFirst, float cFirst, float sLast, float cLast) {
+    const float cc = cLast * ct, sc = sLast * ct;
+    fill3x3(M, cc * cFirst - sLast * sFirst, -cc * sFirst - sLast * cFirst, cLast * st, //
+            sc * cFirst + cLast * sFirst, cLast * cFirst - sc * sFirst, sLast * st,     //
+            -st * cFirst, st * sFirst, ct);
+}
+
+} // namespace
+
+void kelMat::setDataRotationMatrix_ZYZ_3x3(float t, float p, float q) {
+    const SineCosine T(t), P(p), Q(q);
+    fillZYZ(*this, T.s, T.c, P.s, P.c, Q.s, Q.c);
+}
+
+void kelMat::setDataRotationMatrix_ZZYZ_3x3(float t, float p, float q) {
+    const SineCosine T(t), P(p), Q(q);
+    const float sine = Q.s * P.c - Q.c * P.s, cosine = Q.c * P.c + Q.s * P.s; // of q - p
+    fillZYZ(*this, T.s, T.c, sine, cosine, P.s, P.c);
+}
+
+void kelMat::setDataIntrinsicMatrix_3x3(float fx, float fy, float cx, float cy, float skew) {
+    fill3x3(*this, fx, skew, cx, //
+            0.0f, fy, cy,        //
+            0.0f, 0.0f, 1.0f);
+}
+
+void kelMat::setDataTranslationMatrix_3x1(float x, float y, float z) {
+    create(3, 1, false);
+    m_Data[0] = x;
+    m_Data[1] = y;
+    m_Data[2] = z;
+}
+
+// ---- angles ----------------------------------------------------------------------------------------------------------------
+
+namespace {
+
+constexpr double kGimbalCosine = 1e-6f; // below it the second angle counts as +-90 degrees
+
+float clamped(float v) {
+    return v > 1.0f ? 1.0f : v < -1.0f ? -1.0f : v;
+}
+
+// In double and rounded once: the float function differs in the last bit every few angles.
+float angleOf(float sine, float cosine) {
+    return static_cast<float>(atan2(static_cast<double>(sine), static_cast<double>(cosine)));
+}
+
+// The same for a sine and cosine that carry a factor c.
+float angleOf(float sine, float cosine, double c) {
+    return angleOf(clamped(static_cast<float>(sine / c)), clamped(static_cast<float>(cosine / c)));
+}
+
+// The angle of a sine and cosine that may lie a little outside [-1, 1], tested in this order.
+float saturatedAngleOf(float sine, float cosine) {
+    if (cosine > 1.0f)
+        return 0.0f;
+    if (cosine < -1.0f)
+        return kPi;
+    if (sine > 1.0f)
+        return kHalfPi;
+    if (sine < -1.0f)
+        return -kHalfPi;
+    const float angle = acosf(cosine);
+    return sine < 0.0f ? -angle : angle;
+}
+
+} // namespace
+
+bool kelMat::getAngleFromRotationMatrix_XYZ_3x3(float& x, float& y, float& z) {
+    KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
+    const kelMat& R = *this;
+    const float radY = angleOf(clamped(-R[2][0]), std::min(sqrtf(R[2][2] * R[2][2] + R[2][1] * R[2][1]), 1.0f));
+    const double c = cos(static_cast<double>(radY));
+    float radX, radZ;
+    if (c > kGimbalCosine) {
+        radX = angleOf(R[2][1], R[2][2], c);
+        radZ = angleOf(R[1][0], R[0][0], c);
+    } else {
+        radX = angleOf(clamped(-R[1][2]), clamped(R[1][1]));
+        radZ = 0.0f;
+    }
+    x = degrees(radX);
+    y = degrees(radY);
+    z = degrees(radZ);
+    return true;
+}
+
+bool kelMat::getAngleFromRotationMatrix_ZYX_3x3(float& x, float& y, float& z) {
+    KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
+    const kelMat& R = *this;
+    const float radY = angleOf(clamped(R[0][2]), std::min(sqrtf(R[0][0] * R[0][0] + R[0][1] * R[0][1]), 1.0f));
+    const double c = cos(static_cast<double>(radY));
+    float radX, radZ;
+    if (c > kGimbalCosine) {
+        radX = angleOf(-R[1][2], R[2][2], c);
+        radZ = angleOf(-R[0][1], R[0][0], c);
+    } else {
+        radX = angleOf(clamped(R[2][1]), clamped(R[1][1]));
+        radZ = 0.0f;
+    }
+    x = degrees(radX);
+    y = degrees(radY);
+    z = degrees(radZ);
+    return true;
+}
+
+// Inverts setDataRotationMatrix_ZZYZ_3x3, not a ZZYX order; callers rely on the name as it is.
+bool kelMat::getAngleFromRotationMatrix_ZZYX_3x3(float& t, float& p, float& q) {
+    KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
+    constexpr float kSineOfPi = -8.742278e-8f; // of the float pi
+    constexpr double kNoTilt = 1e-6;
+    const kelMat& R = *this;
+    const bool upsideDown = R[2][2] < -1.0f;
+    const float tilt = R[2][2] > 1.0f ? 0.0f : upsideDown ? kPi : acosf(R[2][2]);
+    if (static_cast<double>(fabsf(tilt)) < kNoTilt) {
+        t = 0.0f;
+        p = 0.0f;
+        q = degrees(saturatedAngleOf(R[1][0], R[0][0]));
+        return true;
+    }
+    const float sine = upsideDown ? kSineOfPi : sinf(tilt);
+    const float horizontal = R[0][2] * R[0][2] + R[1][2] * R[1][2];
+    const float cosineRoll = -(R[0][2] * R[2][0] + R[1][2] * R[2][1]) / horizontal;
+    const float sineRoll = (R[2][1] * R[0][2] - R[2][0] * R[1][2]) / horizontal;
+    t = degrees(tilt);
+    p = degrees(saturatedAngleOf(R[1][2] / sine, R[0][2] / sine));
+    q = degrees(saturatedAngleOf(sineRoll, cosineRoll));
+    return true;
+}
+
+bool kelMat::getAngleFromRotationMatrix_ZYZ_3x3(float&, float&, float&) {
+    return true;
+}
+
+// ---- decompositions --------------------------------------------------------------------------------------------------------
+
+namespace {
+
+float dot3(const float* x, const float* y) {
+    return (x[0] * y[0] + x[1] * y[1]) + x[2] * y[2];
+}
+
+} // namespace
+
+bool kelMat::getDecomposedMatrix_ART_3x4(kelMat& A, kelMat& R, kelMat& T) const {
+    KEL_ASSERT(this->m_Width == 4 && this->m_Height == 3);
+    float Q[3][4]; // P, with its sign chosen so that the translation lies before the camera
+    const float sign = (*this)[2][3] < 0.0f ? -1.0f : 1.0f;
+    for (int i = 0; i < 12; ++i)
+        Q[i / 4][i % 4] = m_Data[i] * sign;
+    A.create(3, 3, true);
+    R.create(3, 3, true);
+    T.create(3, 1, true);
+
+    //               | a00 a01 a02 |
+    // Q ~ A [R | T],|     a11 a12 |: the rows of R from the last to the first by Gram-Schmidt
+    //               |         a22 |
+    A[2][2] = sqrtf(dot3(Q[2], Q[2]));
+    const float s = 1.0f / A[2][2];
+    for (int c = 0; c < 3; ++c)
+        R[2][c] = s * Q[2][c];
+    T[2][0] = s * Q[2][3];
+
+    A[0][2] = dot3(R[2], Q[0]);
+    A[1][2] = dot3(R[2], Q[1]);
+    float rest[3];
+    for (int c = 0; c < 3; ++c)
+        rest[c] = Q[1][c] - A[1][2] * R[2][c];
+    A[1][1] = sqrtf(dot3(rest, rest));
+    for (int c = 0; c < 3; ++c)
+        R[1][c] = rest[c] / A[1][1];
+
+    A[0][1] = dot3(R[1], Q[0]);
+    for (int c = 0; c < 3; ++c)
+        rest[c] = Q[0][c] - A[0][1] * R[1][c] - A[0][2] * R[2][c];
+    A[0][0] = sqrtf(dot3(rest, rest));
+    for (int c = 0; c < 3; ++c)
+        R[0][c] = rest[c] / A[0][0];
+
+    T[1][0] = (Q[1][3] - A[1][2] * T[2][0]) / A[1][1];
+    T[0][0] = (Q[0][3] - A[0][1] * T[1][0] - A[0][2] * T[2][0]) / A[0][0];
+    for (int i = 0; i < 9; ++i)
+        A.m_Data[i] *= s;
+    return true;
+}
+
+bool kelMat::getDecomposedMatrix_ART_3x3(kelMat& A, kelMat& R, kelMat& T) const {
+    KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
+    float H[3][3];
+    std::copy_n(m_Data, 9, H[0]);
+    A.create(3, 3, true);
+    R.create(3, 3, true);
+    T.create(3, 1, true);
+
+    const float first = H[0][0] * H[0][0] + H[1][0] * H[1][0], second = H[0][1] * H[0][1] + H[1][1] * H[1][1];
+    const float x = (first - second) / (H[2][1] * H[2][1] - H[2][0] * H[2][0]); // f squared
+    const float f = sqrtf(x), g = 1.0f / f;
+    A[0][0] = f;
+    A[1][1] = f; // A[2][2] stays 0, and s below is not the root: callers rely on both
+    const float s = x / (H[2][0] * H[2][0] * x + first);
+
+    for (int c = 0; c < 2; ++c) {
+        R[0][c] = H[0][c] * s * g;
+        R[1][c] = H[1][c] * s * g;
+        R[2][c] = H[2][c] * s;
+    }
+    R[0][2] = R[1][0] * R[2][1] - R[1][1] * R[2][0];
+    R[1][2] = R[2][0] * R[0][1] - R[2][1] * R[0][0];
+    R[2][2] = R[0][0] * R[1][1] - R[0][1] * R[1][0];
+    T[0][0] = H[0][2] * s * g;
+    T[1][0] = H[1][2] * s * g;
+    T[2][0] = H[2][2] * s;
+    return true;
+}
+
+bool kelMat::getDecomposedMatrix_LU(kelMat& L, kelMat& U) const {
+    KEL_ASSERT(this->m_Width == this->m_Height);
+    const int n = m_Width;
+    kel::Scratch<int, kel::kSmallOrder> indx(n);
+    kel::SmallMat both(*this);
+    float parity;
+    const bool ok = nr_ludcmp(both, indx.data(), &parity);
+    L.create(n, n, true);
+    L.setDataIdentity(1.0f);
+    U.create(n, n, true);
+    for (int r = 0; r < n; ++r) {
+        std::copy_n(both[r], r, L[r]);
+        std::copy(both[r] + r, both[r] + n, U[r] + r);
+    }
+    return ok;
+}
+
+bool kelMat::getDecomposedrixMat_QR(kelMat&, kelMat&) const {
+    return true;
+}
+
+bool kelMat::getDecomposedMatrix_SV(kelMat& U, kelMat& W, kelMat& V) const {
+    return nr_svdcmp(*this, U, W, V);
+}
+
+bool kelMat::getEigenValue(kelMat& d, kelMat& v) {
+    kel::SmallMat copy(*this);
+    int rotations;
+    nr_jacobi(copy, d, v, &rotations);
+    return true;
+}
+
+// With B = L L^T the problem becomes C y = lambda y, C = L^-1 A L^-T, and x = L^-T y.
+bool kelMat::getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X) {
+    const kelMat& A = *this;
+    kel::SmallMat L(B);
+    nr_choldc(L);
+    kel::SmallMat U(L.m_Width, L.m_Height);
+    kel::transpose(U.m_Data, L.m_Data, L.m_Height, L.m_Width);
+    const kelMat M = U.getInversedMatrix(); // empty, as all that follows, where B has no factor with an inverse
+    kel::SmallMat N(M.m_Width, M.m_Height);
+    kel::transpose(N.m_Data, M.m_Data, M.m_Height, M.m_Width);
+    kelMat C = N * A * M, Y;
+    int rotations;
+    nr_jacobi(C, d, Y, &rotations);
+    X = M * Y;
+    return true;
+}
+
+// ---- determinant and inverse -----------------------------------------------------------------------------------------------
+
+float kelMat::getDeterminant() const {
+    KEL_ASSERT(this->m_Width == this->m_Height);
+    KEL_ASSERT(2 <= this->m_Width);
+    switch (m_Width) {
+    case 2:
+        return kel_getDeterminant_2x2(*this);
+    case 3:
+        return kel_getDeterminant_3x3(*this);
+    default:
+        return kel_getDeterminant_NxN(*this);
+    }
+}
+
+bool kelMat::getInversedMatrix(kelMat& R) const {
+    KEL_ASSERT(this->m_Width == this->m_Height);
+    KEL_ASSERT(2 <= this->m_Width);
+    switch (m_Width) {
+    case 2:
+        return kel_getInversedMatrix_2x2(*this, R);
+    case 3:
+        return kel_getInversedMatrix_3x3(*this, R);
+    default:
+        return kel_getInversedMatrix_NxN(*this, R);
+    }
+}
+
+kelMat kelMat::getInversedMatrix() const {
+    kelMat R(0, 0, true);
+    getInversedMatrix(R);
+    return R;
+}
+
+bool kelMat::getInversedMatrix_Pseudo(kelMat& R) const {
+    return kel_getInversedMatrix_NxM(*this, R);
+}
+
+kelMat kelMat::getInversedMatrix_Pseudo() const {
+    kelMat R(0, 0, true);
+    getInversedMatrix_Pseudo(R);
+    return R;
+}

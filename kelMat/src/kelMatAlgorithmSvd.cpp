@@ -1,0 +1,705 @@
+// The singular value decomposition behind nr_svdcmp: Householder bidiagonalisation, then implicit-shift QR. Every element goes
+// through the operations of the textbook loops in their order; only what runs side by side is arranged for vectors.
+#include <algorithm>
+#include <smmintrin.h>
+#include <string.h>
+#include <type_traits>
+
+#include "kelMat_Private.h"
+
+#define KEL_INLINE __attribute__((always_inline))
+
+namespace {
+
+using kel::Scratch;
+
+constexpr int kLanes = 4;
+
+__m128 magnitude(__m128 v) {
+    return _mm_andnot_ps(_mm_set1_ps(-0.0f), v);
+}
+
+// Lanes from .. to - 1 added one after the other.
+KEL_INLINE inline float addLanes(float sum, __m128 v, int from, int to) {
+    alignas(16) float lanes[kLanes];
+    _mm_store_ps(lanes, v);
+    for (int k = from; k < to; ++k)
+        sum += lanes[k];
+    return sum;
+}
+
+// Plane rotation: columns p and q become p c + q s and q c - p s.
+struct Rotation {
+    int p, q;
+    float c, s;
+};
+
+// Rotates N tiles, `tileFloats` apart. The second column of a rotation stays in registers, as it mostly is the first of the next.
+template <int N> void rotate(float* tiles, ptrdiff_t tileFloats, const Rotation* begin, const Rotation* end) {
+    if (begin == end)
+        return;
+    float* P = tiles + kLanes * begin->p;
+    __m128 carried[N];
+    for (int k = 0; k < N; ++k)
+        carried[k] = _mm_load_ps(P + tileFloats * k);
+    for (const Rotation* next = begin; next != end; ++next) {
+        const Rotation r = *next;
+        float *const first = tiles + kLanes * r.p, *const Q = tiles + kLanes * r.q;
+        if (first != P)
+            for (int k = 0; k < N; ++k) {
+                _mm_store_ps(P + tileFloats * k, carried[k]);
+                carried[k] = _mm_load_ps(first + tileFloats * k);
+            }
+        const __m128 c = _mm_set1_ps(r.c), s = _mm_set1_ps(r.s);
+        for (int k = 0; k < N; ++k) {
+            const __m128 x = carried[k], y = _mm_load_ps(Q + tileFloats * k);
+            _mm_store_ps(first + tileFloats * k, _mm_add_ps(_mm_mul_ps(x, c), _mm_mul_ps(y, s)));
+            carried[k] = _mm_sub_ps(_mm_mul_ps(y, c), _mm_mul_ps(x, s));
+        }
+        P = Q;
+    }
+    for (int k = 0; k < N; ++k)
+        _mm_store_ps(P + tileFloats * k, carried[k]);
+}
+
+/*
+ * A matrix in tiles of four rows. A tile takes the place of its rows; a vector in it is four rows of one column:
+ *
+ *     a b c         a d g j
+ *     d e f   ->    b e h k
+ *     g h i         c f i l
+ *     j k l
+ *
+ * So rows are independent lanes, and a sum down a column runs through the lanes of vector after vector. The last one to three
+ * rows, whose place is too small for a tile, have theirs outside the matrix; what its other lanes hold does not matter.
+ */
+class Tiles {
+public:
+    explicit Tiles(kelMat& M)
+        : m_rows(M.m_Height), m_columns(M.m_Width), m_full(M.m_Height / kLanes), m_floats(ptrdiff_t(kLanes) * M.m_Width),
+          m_data(M.m_Data), m_last(m_floats), m_spare(m_floats) {}
+
+    int rows() const { return m_rows; }
+    int columns() const { return m_columns; }
+    ptrdiff_t floats() const { return m_floats; }
+    int count() const { return (m_rows + kLanes - 1) / kLanes; }
+    float* operator[](int tile) { return tile < m_full ? m_data + m_floats * tile : m_last.data(); }
+    float& at(int r, int c) { return (*this)[r / kLanes][kLanes * c + r % kLanes]; }
+
+    // Calls f(tile, from, to) for the tiles that hold the rows from `first` on, which are its lanes from .. to - 1.
+    template <class F> KEL_INLINE void fromRow(int first, F f) {
+        int t = first / kLanes;
+        if (first % kLanes != 0 && t < m_full)
+            f((*this)[t++], first % kLanes, kLanes);
+        for (; t < m_full; ++t)
+            f(m_data + m_floats * t, 0, kLanes);
+        if (t == m_full && kLanes * m_full < m_rows)
+            f(m_last.data(), std::max(first - kLanes * m_full, 0), m_rows - kLanes * m_full);
+    }
+
+    // The same with f(tile, from, to, number): number tiles that follow each other at floats() at once, four where there are.
+    template <class F> KEL_INLINE void fromRowByFours(int first, F f) {
+        const std::integral_constant<int, 1> one;
+        int t = first / kLanes;
+        if (first % kLanes != 0 && t < m_full)
+            f((*this)[t++], first % kLanes, kLanes, one);
+        for (; t + 4 <= m_full; t += 4)
+            f(m_data + m_floats * t, 0, kLanes, std::integral_constant<int, 4>());
+        for (; t < m_full; ++t)
+            f(m_data + m_floats * t, 0, kLanes, one);
+        if (t == m_full && kLanes * m_full < m_rows)
+            f(m_last.data(), std::max(first - kLanes * m_full, 0), m_rows - kLanes * m_full, one);
+    }
+
+    // Applies rotations to the tiles first .. last - 1.
+    void rotate(int first, int last, const Rotation* begin, const Rotation* end) {
+        constexpr int kAtOnce = 8;
+        int t = first;
+        for (; t + kAtOnce <= std::min(last, m_full); t += kAtOnce)
+            ::rotate<kAtOnce>(m_data + m_floats * t, m_floats, begin, end);
+        for (; t < last; ++t)
+            ::rotate<1>((*this)[t], 0, begin, end);
+    }
+
+    // Takes the elements from rows of their own or, one tile after the other, from their place.
+    void pack(const float* source) {
+        for (int t = 0; t < m_full; ++t) {
+            float* const tile = m_data + m_floats * t;
+            if (source != m_data) {
+                toTile(tile, source + m_floats * t);
+            } else {
+                toTile(m_spare.data(), tile);
+                copy(tile, m_spare.data());
+            }
+        }
+        std::fill_n(m_spare.data(), m_floats, 0.0f);
+        std::copy_n(source + m_floats * m_full, restFloats(), m_spare.data());
+        toTile(m_last.data(), m_spare.data());
+    }
+    // Puts the tiles first .. last - 1 back into rows, in their place.
+    void unpack(int first, int last) {
+        for (int t = first; t < std::min(last, m_full); ++t) {
+            float* const tile = m_data + m_floats * t;
+            copy(m_spare.data(), tile);
+            toRows(tile, m_spare.data());
+        }
+        if (last > m_full) {
+            toRows(m_spare.data(), m_last.data());
+            std::copy_n(m_spare.data(), restFloats(), m_data + m_floats * m_full);
+        }
+    }
+
+private:
+    size_t restFloats() const { return static_cast<size_t>(m_columns) * (m_rows - kLanes * m_full); }
+
+    void copy(float* dst, const float* src) const {
+        for (ptrdiff_t i = 0; i < m_floats; i += kLanes)
+            _mm_store_ps(dst + i, _mm_load_ps(src + i));
+    }
+
+    // By blocks of four columns, the last of which overlaps its neighbour where the columns do not come in fours.
+    void toTile(float* tile, const float* rows) const {
+        const int n = m_columns;
+        if (n < kLanes)
+            return kel::transpose(tile, rows, kLanes, n);
+        for (int j = 0; j < n; j += kLanes) {
+            const int c = std::min(j, n - kLanes);
+            const float* const from = rows + c;
+            __m128 v0 = _mm_loadu_ps(from), v1 = _mm_loadu_ps(from + n), v2 = _mm_loadu_ps(from + 2 * n),
+                   v3 = _mm_loadu_ps(from + 3 * n);
+            _MM_TRANSPOSE4_PS(v0, v1, v2, v3);
+            storeFour(tile + kLanes * c, kLanes, v0, v1, v2, v3);
+        }
+    }
+    void toRows(float* rows, const float* tile) const {
+        const int n = m_columns;
+        if (n < kLanes)
+            return kel::transpose(rows, tile, n, kLanes);
+        for (int j = 0; j < n; j += kLanes) {
+            const int c = std::min(j, n - kLanes);
+            const float* const from = tile + kLanes * c;
+            __m128 v0 = _mm_load_ps(from), v1 = _mm_load_ps(from + kLanes), v2 = _mm_load_ps(from + 2 * kLanes),
+                   v3 = _mm_load_ps(from + 3 * kLanes);
+            _MM_TRANSPOSE4_PS(v0, v1, v2, v3);
+            storeFour(rows + c, n, v0, v1, v2, v3);
+        }
+    }
+    static void storeFour(float* to, int pitch, __m128 v0, __m128 v1, __m128 v2, __m128 v3) {
+        _mm_storeu_ps(to, v0);
+        _mm_storeu_ps(to + pitch, v1);
+        _mm_storeu_ps(to + 2 * pitch, v2);
+        _mm_storeu_ps(to + 3 * pitch, v3);
+    }
+
+    const int m_rows, m_columns, m_full;
+    const ptrdiff_t m_floats; // of a tile
+    float* const m_data;
+    Scratch<float, kLanes * kel::kSmallOrder> m_last, m_spare;
+};
+
+// Dot products of one column with the G groups of four columns that end before column `end`, a lane each. Where the groups
+// reach beyond column 0 it stands in for what is not there.
+template <int G> class Dots {
+public:
+    Dots(int x, int end) : m_x(kLanes * x) {
+        for (int i = 0; i < kLanes * G; ++i)
+            m_column[i] = kLanes * std::max(end - kLanes * G + i, 0);
+        for (__m128& sum : m_sums)
+            sum = _mm_setzero_ps();
+    }
+    KEL_INLINE void add(const float* tile, int from, int to) {
+        const __m128 x = _mm_load_ps(tile + m_x);
+        for (int g = 0; g < G; ++g) {
+            __m128 row[kLanes];
+            for (int i = 0; i < kLanes; ++i)
+                row[i] = _mm_mul_ps(x, _mm_load_ps(tile + m_column[kLanes * g + i]));
+            _MM_TRANSPOSE4_PS(row[0], row[1], row[2], row[3]);
+            for (int k = 0; k < kLanes; ++k)
+                if (from <= k && k < to)
+                    m_sums[g] = _mm_add_ps(m_sums[g], row[k]);
+        }
+    }
+    // To the 4 G floats before `end`.
+    void store(float* end) const {
+        for (int g = 0; g < G; ++g)
+            _mm_storeu_ps(end - kLanes * (G - g), m_sums[g]);
+    }
+
+private:
+    const int m_x;
+    int m_column[kLanes * G];
+    __m128 m_sums[G];
+};
+
+constexpr int kMostGroups = 3;
+
+// Calls f with the number of groups that hold `columns` columns, as a constant; the most there is, if more would be needed.
+template <class F> void withGroups(int columns, F f) {
+    if (columns <= kLanes)
+        f(std::integral_constant<int, 1>());
+    else if (columns <= 2 * kLanes)
+        f(std::integral_constant<int, 2>());
+    else
+        f(std::integral_constant<int, kMostGroups>());
+}
+
+// The rotations of U, kept until the QR iteration is over: U takes no part in it.
+class Rotations {
+public:
+    Rotations() : m_data(m_inside), m_count(0), m_capacity(kInside) {}
+    ~Rotations() {
+        if (m_data != m_inside)
+            free(m_data);
+    }
+    Rotations(const Rotations&) = delete;
+    Rotations& operator=(const Rotations&) = delete;
+
+    void add(const Rotation& rotation) {
+        if (m_count == m_capacity)
+            grow();
+        m_data[m_count++] = rotation;
+    }
+    const Rotation* begin() const { return m_data; }
+    const Rotation* end() const { return m_data + m_count; }
+
+private:
+    void grow() {
+        Rotation* const larger = static_cast<Rotation*>(malloc(2 * m_capacity * sizeof(Rotation)));
+        std::copy_n(m_data, m_count, larger);
+        if (m_data != m_inside)
+            free(m_data);
+        m_data = larger;
+        m_capacity *= 2;
+    }
+
+    static constexpr size_t kInside = 256;
+    Rotation m_inside[kInside];
+    Rotation* m_data;
+    size_t m_count, m_capacity;
+};
+
+class Svd {
+public:
+    Svd(kelMat& u, bool withU, kelMat& v)
+        : m(u.m_Height), n(u.m_Width), m_withU(withU), U(u), V(v), v(v), m_space(spaceFor(n)) {
+        float* next = m_space.data();
+        const auto take = [&](ptrdiff_t floats) {
+            next += floats;
+            return next - floats;
+        };
+        m_factor = take(kLanes * n);
+        m_row = take(kLanes * n);
+        m_step = take(kLanes * n);
+        m_sums = take(kLanes * kMostGroups + n) + kLanes * kMostGroups;
+        w = take(n);
+        e = take(n);
+        m_rows = take(static_cast<ptrdiff_t>(n) * n);
+    }
+
+    bool run(const float* a, kelMat& wOut) {
+        U.pack(a);
+        bidiagonalize();
+        accumulateRight();
+        V.pack(v.m_Data);
+        if (m_withU)
+            accumulateLeft();
+        bool converged = true;
+        for (int k = n - 1; k >= 0 && converged; --k)
+            converged = converge(k);
+        V.unpack(0, V.count());
+        if (m_withU)
+            finishU();
+        for (int i = 0; i < n; ++i)
+            wOut[i][i] = w[i];
+        return converged;
+    }
+
+private:
+    static constexpr int kIterations = 30;
+    static constexpr int kFewTiles = 16;
+
+    const int m, n;
+    const bool m_withU;
+    Tiles U, V;
+    kelMat& v;                        // V before it is packed
+    float *m_factor, *m_row, *m_step; // a number per column, each four times
+    float* m_sums;                    // a number per column
+    float *w, *e;                     // diagonal and superdiagonal
+    float* m_rows;                    // the Householder vectors of the rows, n x n
+    Scratch<float, kLanes * kMostGroups + kel::kSmallOrder*(3 * kLanes + 3 + kel::kSmallOrder)> m_space;
+    Rotations m_rotations;
+    float m_norm = 0.0f; // the largest |w| + |e|, the measure of what is negligible
+
+    static size_t spaceFor(size_t n) { return kLanes * kMostGroups + n * (3 * kLanes + 3 + n); }
+    static void fill4(float* four, float x) { _mm_store_ps(four, _mm_set1_ps(x)); }
+    bool negligible(float x) const { return std::fabs(x) + m_norm == m_norm; }
+
+    // ---- to bidiagonal form
+
+    float columnScale(int i) {
+        float scale = 0.0f;
+        U.fromRow(i, [&](const float* tile, int from, int to)
+                         KEL_INLINE { scale = addLanes(scale, magnitude(_mm_load_ps(tile + kLanes * i)), from, to); });
+        return scale;
+    }
+
+    // Divides column i by `scale` from row i on; returns the sum of its squares.
+    float normalizeColumn(int i, float scale) {
+        const __m128 divisor = _mm_set1_ps(scale);
+        float squares = 0.0f;
+        U.fromRow(i, [&](float* tile, int from, int to) KEL_INLINE {
+            const __m128 x = _mm_div_ps(_mm_load_ps(tile + kLanes * i), divisor);
+            _mm_store_ps(tile + kLanes * i, x);
+            squares = addLanes(squares, _mm_mul_ps(x, x), from, to);
+        });
+        return squares;
+    }
+
+    // m_sums[j] = dot product of columns x and j from row `first` on, for left < j < end.
+    void dots(int x, int left, int end, int first) {
+        for (; end - 1 > left; end -= kLanes * kMostGroups)
+            withGroups(end - 1 - left, [&](auto groups) {
+                Dots<groups> sums(x, end);
+                U.fromRow(first, [&](const float* tile, int from, int to) KEL_INLINE { sums.add(tile, from, to); });
+                sums.store(m_sums + end);
+            });
+    }
+
+    // Reflects the columns right of i by column i, which is multiplied by `scale` then, and the rows below i by row i, all in
+    // the rows from i + 1 on. Returns the sum of the magnitudes that column i + 1 has there afterwards.
+    template <bool Column, bool Row> float reflect(int i, float scale) {
+        const int count = n - i - 1; // columns
+        const float *const factor = m_factor + kLanes * (i + 1), *const row = m_row + kLanes * (i + 1),
+                           *const step = m_step + kLanes * (i + 1);
+        const __m128 scales = _mm_set1_ps(scale);
+        float next = 0.0f;
+        const ptrdiff_t apart = U.floats();
+        U.fromRowByFours(i + 1, [&, count, apart](float* tile, int from, int to, auto number) KEL_INLINE {
+            constexpr int N = number;
+            float *const X = tile + kLanes * i, *const A = X + kLanes;
+            __m128 x[N], sum[N];
+            for (int t = 0; t < N; ++t) {
+                x[t] = _mm_load_ps(X + apart * t);
+                sum[t] = _mm_setzero_ps();
+            }
+            for (int j = 0; j < kLanes * count; j += kLanes) {
+                const __m128 f = Column ? _mm_load_ps(factor + j) : _mm_setzero_ps(),
+                             r = Row ? _mm_load_ps(row + j) : _mm_setzero_ps();
+                for (int t = 0; t < N; ++t) {
+                    __m128 a = _mm_load_ps(A + apart * t + j);
+                    if (Column) {
+                        a = _mm_add_ps(a, _mm_mul_ps(f, x[t]));
+                        _mm_store_ps(A + apart * t + j, a);
+                    }
+                    if (Row)
+                        sum[t] = _mm_add_ps(sum[t], _mm_mul_ps(a, r));
+                }
+            }
+            if (Row)
+                for (int j = 0; j < kLanes * count; j += kLanes) {
+                    const __m128 s = _mm_load_ps(step + j);
+                    for (int t = 0; t < N; ++t) {
+                        float* const a = A + apart * t + j;
+                        _mm_store_ps(a, _mm_add_ps(_mm_load_ps(a), _mm_mul_ps(sum[t], s)));
+                    }
+                }
+            for (int t = 0; t < N; ++t) {
+                if (Column)
+                    _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], scales));
+                next = addLanes(next, magnitude(_mm_load_ps(A + apart * t)), from, to);
+            }
+        });
+        return next;
+    }
+
+    // The reflection that takes n numbers, divided by their scale, onto the first: its sum of squares gives the new first
+    // number g and the divisor h of the reflection.
+    struct Reflection {
+        float g, h;
+        Reflection(float first, float squares) : g(-kel::sign(first) * std::sqrt(squares)), h(first * g - squares) {}
+    };
+
+    void bidiagonalize() {
+        float scale = columnScale(0), super = 0.0f;
+        for (int i = 0; i < n; ++i) {
+            e[i] = super;
+            w[i] = 0.0f;
+            super = 0.0f;
+            if (i < m) {
+                const bool column = scale != 0.0f;
+                const float columnScale = scale;
+                float head = 0.0f;
+                if (column) {
+                    const float squares = normalizeColumn(i, scale);
+                    float& first = U.at(i, i);
+                    const Reflection reflection(first, squares);
+                    head = first = first - reflection.g;
+                    dots(i, i, n, i);
+                    for (int j = i + 1; j < n; ++j) {
+                        const float factor = m_sums[j] / reflection.h;
+                        fill4(m_factor + kLanes * j, factor);
+                        U.at(i, j) += factor * head;
+                    }
+                    w[i] = scale * reflection.g;
+                }
+                const bool row = takeRow(i, super);
+                if (i + 1 < n)
+                    scale = column ? row ? reflect<true, true>(i, scale) : reflect<true, false>(i, scale)
+                            : row ? reflect<false, true>(i, scale)
+                                   : reflect<false, false>(i, scale);
+                else if (column)
+                    scaleColumn(i, scale);
+                if (column)
+                    U.at(i, i) = head * columnScale;
+            }
+            const float size = std::fabs(w[i]) + std::fabs(e[i]);
+            m_norm = m_norm > size ? m_norm : size;
+        }
+    }
+
+    // Row i right of the diagonal moves to m_rows as a Householder vector, ready for the rows below in m_row and m_step, and
+    // gives the next superdiagonal element; false where it is zero.
+    bool takeRow(int i, float& super) {
+        const int l = i + 1;
+        float* const row = m_rows + static_cast<ptrdiff_t>(i) * n;
+        float scale = 0.0f, squares = 0.0f;
+        for (int k = l; k < n; ++k) {
+            row[k] = U.at(i, k);
+            scale += std::fabs(row[k]);
+        }
+        if (scale == 0.0f)
+            return false;
+        for (int k = l; k < n; ++k) {
+            row[k] /= scale;
+            squares += row[k] * row[k];
+        }
+        const Reflection reflection(row[l], squares);
+        row[l] -= reflection.g;
+        for (int k = l; k < n; ++k) {
+            fill4(m_row + kLanes * k, row[k]);
+            fill4(m_step + kLanes * k, row[k] / reflection.h);
+            row[k] *= scale;
+        }
+        super = scale * reflection.g;
+        return true;
+    }
+
+    void scaleColumn(int i, float scale) {
+        const __m128 scales = _mm_set1_ps(scale);
+        U.fromRow(i, [&](float* tile, int, int)
+                         KEL_INLINE { _mm_store_ps(tile + kLanes * i, _mm_mul_ps(_mm_load_ps(tile + kLanes * i), scales)); });
+    }
+
+    // ---- the transformations multiplied out
+
+    void accumulateRight() {
+        for (int i = n - 1; i >= 0; --i) {
+            const int l = i + 1;
+            const float* const row = m_rows + static_cast<ptrdiff_t>(i) * n;
+            if (l < n && e[l] != 0.0f) {
+                for (int j = l; j < n; ++j)
+                    v[j][i] = row[j] / row[l] / e[l]; // two divisions: the product of the divisors could underflow
+                std::fill(m_sums + l, m_sums + n, 0.0f);
+                for (int k = l; k < n; ++k)
+                    addMultiple(m_sums, row[k], v[k], l);
+                for (int k = l; k < n; ++k)
+                    addMultiple(v[k], v[k][i], m_sums, l);
+            }
+            for (int j = l; j < n; ++j)
+                v[i][j] = v[j][i] = 0.0f;
+            v[i][i] = 1.0f;
+        }
+    }
+
+    // to[j] += factor * values[j] for the columns from `first` on.
+    void addMultiple(float* to, float factor, const float* values, int first) const {
+        for (int j = first; j < n; ++j)
+            to[j] += factor * values[j];
+    }
+
+    // Column i of N tiles gives its multiples to the columns right of it and is multiplied itself.
+    template <int N> KEL_INLINE void spread(float* tiles, int i, __m128 multiplier) const {
+        const ptrdiff_t apart = U.floats();
+        const float* const factor = m_factor + kLanes * (i + 1);
+        float *const X = tiles + kLanes * i, *const A = X + kLanes;
+        const int count = n - i - 1;
+        __m128 x[N];
+        for (int t = 0; t < N; ++t)
+            x[t] = _mm_load_ps(X + apart * t);
+        for (int j = 0; j < kLanes * count; j += kLanes) {
+            const __m128 f = _mm_load_ps(factor + j);
+            for (int t = 0; t < N; ++t) {
+                float* const a = A + apart * t + j;
+                _mm_store_ps(a, _mm_add_ps(_mm_load_ps(a), _mm_mul_ps(f, x[t])));
+            }
+        }
+        for (int t = 0; t < N; ++t)
+            _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], multiplier));
+    }
+
+    // Step i of the left-hand transformations on the rows from i on, and with it the dot products that step i - 1 needs.
+    template <int G> void spreadAndSum(int i, float multiplier) {
+        const __m128 multipliers = _mm_set1_ps(multiplier);
+        const ptrdiff_t apart = U.floats();
+        Dots<G> sums(i - 1, n);
+        const int head = i / kLanes;
+        spread<1>(U[head], i, multipliers);
+        U.at(i, i) += 1.0f;
+        sums.add(U[head], i % kLanes, std::min(kLanes, m - kLanes * head));
+        U.fromRowByFours(kLanes * (head + 1), [&, apart](float* tiles, int from, int to, auto number) KEL_INLINE {
+            spread<number>(tiles, i, multipliers);
+            for (int t = 0; t < number; ++t)
+                sums.add(tiles + apart * t, from, to);
+        });
+        sums.store(m_sums + n);
+    }
+
+    void accumulateLeft() {
+        const int last = std::min(m, n) - 1;
+        dots(last, last, n, last + 1);
+        for (int i = last; i >= 0; --i) {
+            for (int j = i + 1; j < n; ++j)
+                U.at(i, j) = 0.0f;
+            if (w[i] == 0.0f) {
+                U.fromRow(i, [&](float* tile, int, int) KEL_INLINE { fill4(tile + kLanes * i, 0.0f); });
+                U.at(i, i) += 1.0f;
+                dots(i - 1, i - 1, n, i);
+                continue;
+            }
+            const float reciprocal = 1.0f / w[i], diagonal = U.at(i, i);
+            for (int j = i + 1; j < n; ++j)
+                fill4(m_factor + kLanes * j, m_sums[j] / diagonal * reciprocal);
+            if (i > 0) {
+                withGroups(n - i, [&](auto groups) { spreadAndSum<groups>(i, reciprocal); });
+                dots(i - 1, i - 1, n - kLanes * kMostGroups, i);
+            } else {
+                const __m128 multipliers = _mm_set1_ps(reciprocal);
+                U.fromRowByFours(0, [&](float* tiles, int, int, auto number)
+                                        KEL_INLINE { spread<number>(tiles, 0, multipliers); });
+                U.at(0, 0) += 1.0f;
+            }
+        }
+    }
+
+    // ---- to diagonal form
+
+    // Iterates on the block that ends at k until e[k] is negligible.
+    bool converge(int k) {
+        for (int iteration = 1;; ++iteration) {
+            const int l = split(k);
+            if (l == k) {
+                if (w[k] < 0.0f) {
+                    w[k] = -w[k];
+                    V.fromRow(0, [&](float* tile, int, int) {
+                        _mm_store_ps(tile + kLanes * k, _mm_xor_ps(_mm_load_ps(tile + kLanes * k), _mm_set1_ps(-0.0f)));
+                    });
+                }
+                return true;
+            }
+            if (iteration == kIterations)
+                return false;
+            sweep(l, k);
+        }
+    }
+
+    // The start of the unreduced block that ends at k. It stops at 0 whatever the numbers are, NaN included.
+    int split(int k) {
+        for (int l = k; l > 0; --l) {
+            if (negligible(e[l]))
+                return l;
+            if (negligible(w[l - 1])) {
+                cancel(l, k);
+                return l;
+            }
+        }
+        return 0;
+    }
+
+    // w[l - 1] is zero: rotates e[l .. k] away.
+    void cancel(int l, int k) {
+        float c = 0.0f, s = 1.0f;
+        for (int i = l; i <= k; ++i) {
+            const float f = s * e[i];
+            e[i] = c * e[i];
+            if (negligible(f))
+                return;
+            const float g = w[i], h = kel::pythag(f, g), reciprocal = 1.0f / h;
+            w[i] = h;
+            c = g * reciprocal;
+            s = -f * reciprocal;
+            rotateU(l - 1, i, c, s);
+        }
+    }
+
+    // One implicit QR step on the block from l to k, shifted by an eigenvalue of its last 2x2 minor.
+    void sweep(int l, int k) {
+        float x = w[l], y = w[k - 1], g = e[k - 1], h = e[k];
+        const float z = w[k];
+        float f = ((y - z) * (y + z) + (g - h) * (g + h)) / (2.0f * h * y);
+        g = kel::pythag(f, 1.0f);
+        f = ((x - z) * (x + z) + h * (y / (f + kel::sign(f) * g) - h)) / x;
+        float c = 1.0f, s = 1.0f;
+        for (int j = l; j < k; ++j) {
+            const int i = j + 1;
+            g = e[i];
+            y = w[i];
+            h = s * g;
+            g = c * g;
+            float length = kel::pythag(f, h);
+            e[j] = length;
+            c = f / length;
+            s = h / length;
+            f = x * c + g * s;
+            g = g * c - x * s;
+            h = y * s;
+            y = y * c;
+            rotateAll(V, {j, i, c, s});
+            length = kel::pythag(f, h);
+            w[j] = length;
+            if (length != 0.0f) { // else c and s stay
+                const float reciprocal = 1.0f / length;
+                c = f * reciprocal;
+                s = h * reciprocal;
+            }
+            f = c * g + s * y;
+            x = c * y - s * g;
+            rotateU(j, i, c, s);
+        }
+        e[l] = 0.0f;
+        e[k] = f;
+        w[k] = x;
+    }
+
+    static void rotateAll(Tiles& M, const Rotation& rotation) { M.rotate(0, M.count(), &rotation, &rotation + 1); }
+
+    // A small U turns at once, beside the long chains of divisions and roots above; a large one in the end, part by part.
+    void rotateU(int p, int q, float c, float s) {
+        if (!m_withU)
+            return;
+        if (U.count() <= kFewTiles)
+            rotateAll(U, {p, q, c, s});
+        else
+            m_rotations.add({p, q, c, s});
+    }
+
+    void finishU() {
+        for (int first = 0; first < U.count(); first += kFewTiles) {
+            const int last = std::min(first + kFewTiles, U.count());
+            U.rotate(first, last, m_rotations.begin(), m_rotations.end());
+            U.unpack(first, last);
+        }
+    }
+};
+
+} // namespace
+
+namespace kel {
+
+bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v) {
+    const int n = u.m_Width;
+    w.create(n, n, true);
+    v.create(n, n, true);
+    return n == 0 || Svd(u, withU, v).run(a, w);
+}
+
+} // namespace kel

@@ -1,0 +1,269 @@
+// Resizing, borders, flips and warp against plain references, byte for byte, padding and neighbours included.
+#include <cmath>
+#include <functional>
+#include <limits>
+
+#include "GuardedImage.h"
+#include "Stops.h"
+#include "TransformReference.h"
+
+namespace {
+
+using kel_test::Bytes;
+using kel_test::Fill;
+using kel_test::Guard;
+using kel_test::Image;
+using Operation = std::function<void(kelImage_t*, const kelImage_t*)>;
+
+const int kMoved[] = {0, 3, 8, 24, 16, 32}; // types that are moved as whole pixels
+
+struct Size {
+    int width, height;
+};
+
+// Runs an operation and its reference on guarded images, and expects the same destination and an untouched source.
+void compare(const Operation& operation, const Operation& reference, Size dstSize, Size srcSize, int type,
+             Guard guard = Guard::Behind, Fill fill = Fill::Random, size_t extra = 0) {
+    Image src(srcSize.width, srcSize.height, type, guard, extra), dst(dstSize.width, dstSize.height, type, guard),
+        expected(dstSize.width, dstSize.height, type);
+    src.fill(fill, 5);
+    expected.set(dst.bytes());
+    const Bytes source = src.bytes();
+    reference(expected.get(), src.get());
+    operation(dst.get(), src.get());
+    EXPECT_TRUE(holds(dst, expected.bytes())) << "from " << srcSize.width << "x" << srcSize.height;
+    EXPECT_TRUE(holds(src, source));
+}
+
+const int kWidths[] = {1,  2,  3,  4,  5,  6,  7,  8,  9,  10, 11, 12, 15, 16, 17, 18, 19, 20, 21, 23, 24,
+                       25, 30, 31, 32, 33, 34, 35, 36, 37, 40, 47, 48, 49, 50, 63, 64, 65, 66, 80, 97};
+
+} // namespace
+
+TEST(Flip, MovesEveryPixelOnceForAllWidthsAndPixelSizes) {
+    const struct {
+        void (*flip)(kelImage_t*, const kelImage_t*);
+        bool mirrored, upsideDown;
+    } flips[] = {{rotateKelImageH, true, false}, {rotateKelImageV, false, true}, {rotateKelImageVH, true, true}};
+    for (const auto& f : flips)
+        for (int type : kMoved)
+            for (int width = 0; width <= 70; ++width)
+                for (Guard guard : {Guard::Behind, Guard::Before})
+                    compare(
+                        f.flip,
+                        [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::flip(dst, src, f.mirrored, f.upsideDown); },
+                        {width, 1 + width % 3}, {width, 1 + width % 3}, type, guard);
+}
+
+TEST(Half, KeepsEverySecondPixelOfEverySecondRow) {
+    for (int type : kMoved)
+        for (int width = 1; width <= 140; ++width)
+            for (Guard guard : {Guard::Behind, Guard::Before})
+                compare(resizeKelImageHalf, kel_ref::half, {width / 2, width % 5 / 2}, {width, width % 5}, type, guard);
+}
+
+TEST(Nearest, SamplesAtWholeRatiosByWidth) {
+    for (int type : kMoved)
+        for (Size dst : {Size{1, 1}, Size{5, 3}, Size{12, 2}, Size{16, 4}, Size{17, 5}, Size{40, 3}})
+            for (int rx : {0, 1, 2, 3, 4, 5, 8})
+                for (int rest : {0, 1, 4})
+                    for (int ry : {0, 1, 2, 3})
+                        compare(resizeKelImageNearest, kel_ref::nearest, dst,
+                                {std::max(1, dst.width * rx + std::min(rest, dst.width - 1)), std::max(1, dst.height * ry)},
+                                type);
+    // Beyond the sizes where single precision is exact.
+    compare(resizeKelImageNearest, kel_ref::nearest, {4200000, 1}, {12600001, 1}, 0);
+    compare(resizeKelImageNearest, kel_ref::nearest, {6000000, 1}, {18000001, 1}, 0);
+}
+
+TEST(Bilinear, AveragesNeighboursAtWholeRatiosByWidth) {
+    for (Fill fill : kel_test::kFills)
+        for (int width : kWidths)
+            for (int rx : {0, 1, 2, 3, 4, 5, 7})
+                for (int ry : {0, 1, 2, 3}) {
+                    const Size dst = {width, 3};
+                    compare(resizeKelImageBilinear, kel_ref::bilinear, dst,
+                            {std::max(1, width * rx + (rx ? (width - 1) / 2 : 0)), std::max(1, 3 * ry)}, 0, Guard::Behind,
+                            fill);
+                }
+    compare(resizeKelImageBilinear, kel_ref::bilinear, {31, 16}, {31, 17}, 0);
+    compare(resizeKelImageBilinear, kel_ref::bilinear, {4200000, 1}, {12600001, 1}, 0);
+    compare(resizeKelImageBilinear, kel_ref::bilinear, {6000000, 1}, {18000001, 1}, 0);
+    compare(resizeKelImageBilinear, kel_ref::bilinear, {5, 3}, {15, 9}, KEL_PIXEL_TYPE_U8XYZ);
+}
+
+TEST(LinearInterpolation, EnlargesByAnyRatio) {
+    // One pixel behind the last is read: four bytes more.
+    for (Fill fill : {Fill::Random, Fill::Max, Fill::Alternating})
+        for (int from : {1, 2, 3, 5, 8, 16, 17})
+            for (int to : {1, 2, 3, 4, 5, 7, 8, 16, 17, 18, 33, 48})
+                if (to >= from)
+                    for (int rows : {1, 3, 4})
+                        for (int toRows : {4, 5, 9})
+                            compare(resizeLinerInterpolation, kel_ref::linearInterpolation, {to, toRows}, {from, rows}, 16,
+                                    Guard::Behind, fill, 4);
+    compare(resizeLinerInterpolation, kel_ref::linearInterpolation, {16, 16}, {16, 16}, 32, Guard::Behind, Fill::Random, 4);
+}
+
+TEST(ZeroOrderHold, AveragesByAnyRatio) {
+    for (Fill fill : {Fill::Random, Fill::Max, Fill::Alternating})
+        for (int from : {1, 2, 3, 5, 8, 16, 17, 33, 64, 97})
+            for (int to : {1, 2, 3, 4, 5, 7, 8, 16, 17, 33, 64})
+                if (to <= from)
+                    for (int rows : {1, 3, 6, 17})
+                        for (int toRows : {1, 3, 4, 20})
+                            compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {to, toRows}, {from, rows}, 16,
+                                    Guard::Behind, fill);
+    // Boxes too large for the reciprocal.
+    compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 1}, {4099, 2}, 32);
+    compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {3, 1}, {4106, 1}, 32);
+    compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 2}, {2, 9001}, 32, Guard::Behind, Fill::Max);
+}
+
+TEST(Border, ReplicatesEdgesAndCropsThemAgain) {
+    for (int type : kMoved)
+        for (int width : kWidths)
+            for (int height : {1, 2, 5})
+                for (int size : {0, 1, 2, 7, 16, 19}) {
+                    const Size outer = {width + 2 * size, height + 2 * size};
+                    compare([&](kelImage_t* dst, const kelImage_t* src) { resizeKelImageEnborder(dst, src, size); },
+                            [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::enborder(dst, src, size); }, outer,
+                            {width, height}, type);
+                    compare([&](kelImage_t* dst, const kelImage_t* src) { resizeKelImageDeborder(dst, src, size); },
+                            [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::deborder(dst, src, size); }, {width, height},
+                            outer, type);
+                }
+}
+
+namespace {
+
+void warpBy(kelImage_t* dst, const kelImage_t* src, const float* h) {
+    rotateKelImageHomography(dst, src, h[0], h[1], h[2], h[3], h[4], h[5], h[6], h[7], h[8]);
+}
+
+} // namespace
+
+TEST(Warp, SamplesAsTheReferenceDoesForAnyHomography) {
+    const float inf = std::numeric_limits<float>::infinity(), nan = std::numeric_limits<float>::quiet_NaN();
+    std::vector<std::array<float, 9>> homographies = {
+        {1, 0, 0, 0, 1, 0, 0, 0, 1},
+        {2, 0, 0, 0, 2, 0, 0, 0, 1},
+        {1, 0, -0.7f, 0, 1, -0.3f, 0, 0, 1}, // quotients in (-1, 0)
+        {1, 0, -5, 0, 1, 3, 0, 0, 1},
+        {1, 0, 0.49999997f, 0, 1, 0.49999997f, 0, 0, 1}, // + 0.5 rounds up to 1
+        {0, 0, 0.49999997f, 0, 0, 0.49999997f, 0, 0, 1},
+        {1, 0, 0, 0, 1, 0, 0.25f, 0, -1}, // a denominator of 0 inside
+        {1, 0, 0, 0, 1, 0, 0, 0, 0},
+        {1e30f, 0, 0, 0, 1, 0, 0, 0, 1e-8f},
+        {0, 0, 4294967296.0f + 512, 0, 0, 4294967296.0f, 0, 0, 1}, // 2^32 must not wrap to 0
+        {0, 0, -4294967296.0f, 0, 0, 2147483648.0f, 0, 0, 1},
+        {inf, 0, 0, 0, 1, 0, 0, 0, 1},
+        {1, 0, nan, 0, 1, 0, 0, 0, 1},
+        {1, 0, 0, 0, nan, 0, 0, 0, 1},
+        {0, 0, 0, 0, 0, 0, 0, 0, 0}};
+    std::mt19937 random = kel_test::generator(43);
+    std::uniform_real_distribution<float> uniform(-1, 1);
+    for (int i = 0; i < 60; ++i) {
+        std::array<float, 9> h;
+        for (float& value : h)
+            value = uniform(random) * (i % 2 ? 1.5f : 0.2f);
+        h[0] += 1;
+        h[4] += 1;
+        h[2] *= 20;
+        h[5] *= 20;
+        h[6] *= 0.02f;
+        h[7] *= 0.02f;
+        h[8] = 1;
+        homographies.push_back(h);
+    }
+    for (const auto& h : homographies)
+        for (int type : {0, 3, 8, 16})
+            for (int width : {1, 3, 4, 7, 16, 19, 37})
+                for (Guard guard : {Guard::Behind, Guard::Before})
+                    compare([&](kelImage_t* dst, const kelImage_t* src) { warpBy(dst, src, h.data()); },
+                            [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::warp(dst, src, h.data()); }, {width, 9},
+                            {40 - width, 17}, type, guard);
+}
+
+TEST(Warp, FillsWithZeroFromAnEmptySource) {
+    Image src(0, 0, 0), dst(20, 3, 0);
+    const float identity[9] = {1, 0, 0, 0, 1, 0, 0, 0, 1};
+    Bytes expected = dst.bytes();
+    for (int y = 0; y < 3; ++y)
+        std::fill_n(expected.begin() + 32 * y, 20, 0);
+    warpBy(dst.get(), src.get(), identity);
+    EXPECT_TRUE(holds(dst, expected));
+}
+
+TEST(Transforms, IgnoreTypesThatTheyDoNotHandle) {
+    for (int type : {1, 7, 9, 40, 47, 48, -1}) {
+        Image dst(20, 4, type), src(20, 4, type);
+        Image half(10, 2, type);
+        const Bytes before = dst.bytes(), halfBefore = half.bytes();
+        const float identity[9] = {1, 0, 0, 0, 1, 0, 0, 0, 1};
+        resizeKelImage(dst.get(), src.get());
+        resizeKelImageNearest(dst.get(), src.get());
+        resizeKelImageBilinear(dst.get(), src.get());
+        resizeKelImageHalf(half.get(), src.get());
+        resizeKelImageEnborder(dst.get(), src.get(), 0);
+        resizeKelImageDeborder(dst.get(), src.get(), 0);
+        rotateKelImageH(dst.get(), src.get());
+        rotateKelImageV(dst.get(), src.get());
+        rotateKelImageVH(dst.get(), src.get());
+        warpBy(dst.get(), src.get(), identity);
+        EXPECT_TRUE(holds(dst, before));
+        EXPECT_TRUE(holds(half, halfBefore));
+    }
+}
+
+TEST(Transforms, StopOnTypesAndSizesThatDoNotFit) {
+    const char *const resizer = "kelImage/src/kelImage_Resizer_c_legacy.cpp",
+                      *const rotater = "kelImage/src/kelImage_Rotater_c_legacy.cpp", *const sameType = "dst->type == src->type";
+    Image grey(20, 10, 0), wide(21, 10, 0), tall(20, 11, 0), colour(20, 10, 8), odd(20, 10, 7), oddWide(21, 10, 7);
+    const struct {
+        const char *name, *file, *text;
+        std::function<void(kelImage_t*, const kelImage_t*)> call;
+        Image *dst, *src;
+    } cases[] = {
+        {"resizeKelImage(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImage, &grey, &colour},
+        {"resizeKelImageNearest(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImageNearest, &grey, &colour},
+        {"resizeKelImageBilinear(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImageBilinear, &colour, &grey},
+        {"resizeKelImageHalf(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImageHalf, &grey, &colour},
+        {"resizeKelImageHalf(kelImage_t*, const kelImage_t*)", resizer, "dst->width == src->width / 2", resizeKelImageHalf,
+         &grey, &grey},
+        {"resizeKelImageEnborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer, sameType,
+         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageEnborder(d, s, 0); }, &grey, &colour},
+        {"resizeKelImageEnborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer,
+         "dst->width == src->width +2*size && dst->height == src->height + 2*size",
+         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageEnborder(d, s, 0); }, &odd, &oddWide},
+        {"resizeKelImageEnborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer,
+         "dst->width == src->width +2*size && dst->height == src->height + 2*size",
+         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageEnborder(d, s, 0); }, &grey, &tall},
+        {"resizeKelImageDeborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer, sameType,
+         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageDeborder(d, s, 0); }, &grey, &colour},
+        {"resizeKelImageDeborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer,
+         "dst->width == src->width - 2*size && dst->height == src->height - 2*size",
+         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageDeborder(d, s, 1); }, &grey, &wide},
+        {"rotateKelImageH(kelImage_t*, const kelImage_t*)", rotater, sameType, rotateKelImageH, &grey, &colour},
+        {"rotateKelImageV(kelImage_t*, const kelImage_t*)", rotater, sameType, rotateKelImageV, &grey, &colour},
+        {"rotateKelImageVH(kelImage_t*, const kelImage_t*)", rotater, sameType, rotateKelImageVH, &grey, &colour},
+        {"rotateKelImageH(kelImage_t*, const kelImage_t*)", rotater, "dst->width == src->width && dst->height == src->height",
+         rotateKelImageH, &grey, &wide},
+        {"rotateKelImageV(kelImage_t*, const kelImage_t*)", rotater, "dst->width == src->width && dst->height == src->height",
+         rotateKelImageV, &grey, &tall},
+        {"rotateKelImageVH(kelImage_t*, const kelImage_t*)", rotater, "dst->width == src->width && dst->height == src->height",
+         rotateKelImageVH, &odd, &oddWide},
+        {"rotateKelImageHomography(kelImage_t*, const kelImage_t*, float, float, float, float, float, float, float, float, "
+         "float)",
+         rotater, sameType,
+         [](kelImage_t* d, const kelImage_t* s) { rotateKelImageHomography(d, s, 1, 0, 0, 0, 1, 0, 0, 0, 1); }, &grey, &colour},
+    };
+    for (const auto& c : cases)
+        EXPECT_STOPS(c.call(c.dst->get(), c.src->get()), c.text, c.file, std::string("void ") + c.name);
+    Image half(10, 6, 0);
+    EXPECT_STOPS(resizeKelImageHalf(half.get(), grey.get()), "dst->height == src->height / 2", resizer,
+                 "void resizeKelImageHalf(kelImage_t*, const kelImage_t*)");
+    // The ratio comes before the check: an empty destination divides by zero whatever its type.
+    Image none(0, 4, 8);
+    EXPECT_EXIT(resizeKelImageBilinear(none.get(), grey.get()), testing::KilledBySignal(SIGFPE), "");
+}

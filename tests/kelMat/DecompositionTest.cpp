@@ -1,0 +1,272 @@
+// Members that split a matrix: cameras, homographies, LU, determinants and inverses.
+#include "MatSupport.h"
+#include "Memory.h"
+#include "Stops.h"
+
+using namespace kel_test;
+
+namespace {
+
+const char kFile[] = "kelMat/src/kelMat.cpp";
+
+kelMat rotation(float x, float y, float z) {
+    kelMat R;
+    R.setDataRotationMatrix_XYZ_3x3(x, y, z);
+    return R;
+}
+
+kelMat identity(int n) {
+    kelMat I(n, n);
+    I.setDataIdentity(1);
+    return I;
+}
+
+} // namespace
+
+TEST(CameraDecomposition, FindsIntrinsicsRotationAndTranslation) {
+    std::mt19937 random = generator(30);
+    std::uniform_real_distribution<float> angle(-170, 170), shift(-3, 3);
+    kelMat A0 = mat({{800, 0.5f, 320}, {0, 700, 240}, {0, 0, 1}}), A, R, T;
+    for (int i = 0; i < 200; ++i) {
+        const kelMat R0 = rotation(angle(random), angle(random), angle(random));
+        const kelMat T0 = mat({{shift(random)}, {shift(random)}, {4 + shift(random)}});
+        for (float factor : {1.0f, -1.0f, 0.01f, -37.0f}) {
+            const kelMat P = A0 * (R0 | T0) * factor;
+            ASSERT_TRUE(P.getDecomposedMatrix_ART_3x4(A, R, T));
+            EXPECT_TRUE(near(A, A0, 3e-3));
+            EXPECT_TRUE(near(R, R0, 1e-5));
+            EXPECT_TRUE(near(T, T0, 1e-4));
+            EXPECT_GE(T[2][0], 0.0f);
+            EXPECT_EQ(A[1][0], 0.0f);
+            EXPECT_EQ(A[2][0], 0.0f);
+            EXPECT_EQ(A[2][1], 0.0f);
+            EXPECT_NEAR(A[2][2], 1.0f, kEps);
+        }
+    }
+}
+
+TEST(CameraDecomposition, GivesTheSameBitsForBothSigns) {
+    for (uint32_t salt = 0; salt < 50; ++salt) {
+        const kelMat P = randomMatrix(3, 4, salt);
+        kelMat A, R, T, a(3, 3), r(1, 1), t(2, 2);
+        P.getDecomposedMatrix_ART_3x4(A, R, T);
+        (P * -1.0f).getDecomposedMatrix_ART_3x4(a, r, t);
+        EXPECT_TRUE(same(A, a));
+        EXPECT_TRUE(same(R, r));
+        EXPECT_TRUE(same(T, t));
+        // A mirror is not corrected, and rows are orthonormal all the same.
+        EXPECT_TRUE(near(R * R.getTransposedMatrix(), identity(3), 2e-4));
+        kelMat scaled = P * (P[2][3] < 0 ? -1.0f / A[2][2] : 1.0f);
+        EXPECT_GE(T[2][0], 0.0f);
+    }
+    kelMat A, R, T;
+    EXPECT_TRUE(kelMat(3, 4).getDecomposedMatrix_ART_3x4(A, R, T)) << "degenerate input is not reported";
+    EXPECT_TRUE(std::isnan(R[0][0]));
+    EXPECT_STOPS(kelMat(4, 4).getDecomposedMatrix_ART_3x4(A, R, T), "this->m_Width == 4 && this->m_Height == 3", kFile,
+                 "bool kelMat::getDecomposedMatrix_ART_3x4(kelMat&, kelMat&, kelMat&) const");
+}
+
+TEST(HomographyDecomposition, FindsTheFocalLengthAndPose) {
+    std::mt19937 random = generator(31);
+    std::uniform_real_distribution<float> tilt(20, 50), shift(-3, 3);
+    kelMat A, R, T;
+    for (int i = 0; i < 100; ++i) {
+        const float f = 500;
+        const kelMat R0 = rotation(tilt(random), -tilt(random), tilt(random));
+        const kelMat T0 = mat({{shift(random)}, {shift(random)}, {4 + shift(random)}});
+        kelMat H(3, 3), K = mat({{f, 0, 0}, {0, f, 0}, {0, 0, 1}});
+        for (int r = 0; r < 3; ++r)
+            for (int c = 0; c < 3; ++c)
+                H[r][c] = c < 2 ? R0[r][c] : T0[r][0];
+        ASSERT_TRUE((K * H).getDecomposedMatrix_ART_3x3(A, R, T));
+        EXPECT_NEAR(A[0][0], f, 0.05);
+        EXPECT_TRUE(same(A, mat({{A[0][0], 0, 0}, {0, A[0][0], 0}, {0, 0, 0}}))) << "the last element stays 0";
+        EXPECT_TRUE(near(R, R0, 1e-3));
+        EXPECT_TRUE(near(T, T0, 1e-3));
+        // Another scale is not taken out: with s = 1 / lambda^2 in place of its root the pose shrinks by lambda.
+        ASSERT_TRUE((K * H * 2.0f).getDecomposedMatrix_ART_3x3(A, R, T));
+        EXPECT_TRUE(near(T * 2.0f, T0, 2e-3));
+    }
+    EXPECT_TRUE(identity(3).getDecomposedMatrix_ART_3x3(A, R, T));
+    EXPECT_TRUE(std::isnan(A[0][0]) && std::isnan(T[0][0]));
+    EXPECT_STOPS(kelMat(3, 4).getDecomposedMatrix_ART_3x3(A, R, T), "this->m_Width == 3 && this->m_Height == 3", kFile,
+                 "bool kelMat::getDecomposedMatrix_ART_3x3(kelMat&, kelMat&, kelMat&) const");
+}
+
+TEST(LuDecomposition, SplitsTheKernelsResult) {
+    kelMat L(1, 1), U;
+    EXPECT_TRUE(mat({{0, 1}, {1, 0}}).getDecomposedMatrix_LU(L, U));
+    EXPECT_TRUE(same(L, identity(2)));
+    EXPECT_TRUE(same(U, identity(2))) << "of the swapped rows, not of the input";
+    for (int n = 1; n <= 20; ++n) {
+        const kelMat A = randomMatrix(n, n, 32);
+        Reference a = reference(A), lower = kel_ref::identity<float>(n), upper(n, n);
+        std::vector<int> indx(n);
+        float d;
+        const bool ok = kel_ref::ludcmp(a, indx.data(), &d);
+        for (int r = 0; r < n; ++r)
+            for (int c = 0; c < n; ++c)
+                (c < r ? lower : upper)[r][c] = a[r][c];
+        EXPECT_EQ(A.getDecomposedMatrix_LU(L, U), ok);
+        EXPECT_TRUE(same(L, lower));
+        EXPECT_TRUE(same(U, upper));
+    }
+    EXPECT_FALSE(mat({{1, 2}, {0, 0}}).getDecomposedMatrix_LU(L, U));
+    EXPECT_TRUE(same(L, identity(2)));
+    EXPECT_TRUE(same(U, mat({{1, 2}, {0, 0}}))) << "filled from the input";
+    EXPECT_TRUE(kelMat().getDecomposedMatrix_LU(L, U));
+    EXPECT_TRUE(sameSize(L, 0, 0));
+    EXPECT_STOPS(kelMat(2, 3).getDecomposedMatrix_LU(L, U), "this->m_Width == this->m_Height", kFile,
+                 "bool kelMat::getDecomposedMatrix_LU(kelMat&, kelMat&) const");
+}
+
+TEST(QrDecomposition, IsInert) {
+    kelMat Q = mat({{1, 2}}), R = mat({{3}});
+    EXPECT_TRUE(randomMatrix(2, 3, 1).getDecomposedrixMat_QR(Q, R));
+    EXPECT_TRUE(same(Q, mat({{1, 2}})));
+    EXPECT_TRUE(same(R, mat({{3}})));
+}
+
+TEST(Determinant, OfEverySize) {
+    EXPECT_EQ(mat({{1, 2}, {3, 4}}).getDeterminant(), -2.0f);
+    EXPECT_EQ(identity(3).getDeterminant(), 1.0f);
+    EXPECT_EQ(mat({{1, 0, 0, 0}, {0, 2, 0, 0}, {0, 0, 3, 0}, {0, 0, 0, 4}}).getDeterminant(), 24.0f);
+    EXPECT_EQ(mat({{0, 1, 0, 0}, {1, 0, 0, 0}, {0, 0, 3, 0}, {0, 0, 0, 4}}).getDeterminant(), -12.0f);
+    EXPECT_EQ(mat({{1, 2, 3, 4}, {0, 0, 0, 0}, {5, 6, 7, 9}, {1, 0, 0, 1}}).getDeterminant(), 0.0f);
+    EXPECT_NEAR(mat({{1, 2, 3, 4}, {5, 6, 7, 8}, {1, 2, 3, 4}, {4, 3, 1, 1}}).getDeterminant(), 0.0f, 1e-30);
+    for (int n = 2; n <= 12; ++n)
+        for (uint32_t salt = 0; salt < 20; ++salt) {
+            const kelMat A = randomMatrix(n, n, 400 + salt);
+            Truth LU = reference<double>(A);
+            std::vector<int> indx(n);
+            double truth;
+            kel_ref::ludcmp(LU, indx.data(), &truth);
+            for (int i = 0; i < n; ++i)
+                truth *= LU[i][i];
+            EXPECT_NEAR(A.getDeterminant(), truth, 20 * n * kEps) << n;
+        }
+    // Grouping: with a13 = 0 and huge cofactors the expansion along the last column meets no infinity.
+    EXPECT_EQ(mat({{1e30f, 1, 0}, {1e30f, 2, 0}, {1, 1, 0}}).getDeterminant(), 0.0f);
+}
+
+TEST(Inverse, OfEverySize) {
+    EXPECT_TRUE(near(mat({{4, 7}, {2, 6}}).getInversedMatrix(), mat({{0.6f, -0.7f}, {-0.2f, 0.4f}}), 1e-7));
+    EXPECT_TRUE(same(mat({{3, 0}, {0, 7}}).getInversedMatrix(), mat({{7.0f / 21, -0.0f}, {-0.0f, 3.0f / 21}})))
+        << "divided by the determinant, not multiplied by its reciprocal";
+    for (uint32_t salt = 0; salt < 100; ++salt) {
+        const kelMat A = randomMatrix(3, 3, 500 + salt);
+        EXPECT_TRUE(same(A.getInversedMatrix(), kel_ref::adjugateInverse3x3(reference(A))));
+    }
+    for (int n = 2; n <= 12; ++n)
+        for (uint32_t salt = 0; salt < 20; ++salt) {
+            const kelMat A = randomMatrix(n, n, 600 + salt);
+            kelMat R = mat({{1}});
+            ASSERT_TRUE(A.getInversedMatrix(R));
+            Truth truth;
+            kel_ref::inverse(reference<double>(A), truth);
+            const double condition = norm(reference<double>(A)) * norm(truth);
+            EXPECT_LT(distance(reference<double>(R), truth), 2 * kEps * condition * norm(truth)) << n;
+            if (n > 3) {
+                Reference plain;
+                kel_ref::inverse(reference(A), plain);
+                EXPECT_TRUE(same(R, plain));
+            }
+        }
+}
+
+TEST(Inverse, LeavesTheOutputOfSingularMatrices) {
+    const kelMat singular[] = {mat({{1, 2}, {2, 4}}), mat({{1, 2, 3}, {0, 0, 0}, {4, 5, 6}}),
+                               mat({{1, 2, 3, 4}, {0, 0, 0, 0}, {4, 5, 6, 7}, {9, 9, 9, 8}})};
+    for (const kelMat& A : singular) {
+        kelMat R = mat({{1, 2, 3}});
+        EXPECT_FALSE(A.getInversedMatrix(R));
+        EXPECT_TRUE(same(R, mat({{1, 2, 3}})));
+        EXPECT_TRUE(sameSize(A.getInversedMatrix(), 0, 0));
+    }
+    kelMat R = mat({{1, 2, 3}});
+    EXPECT_FALSE(kel_getInversedMatrix_NxM(mat({{1, 2}, {2, 4}, {3, 6}}), R));
+    EXPECT_TRUE(same(R, mat({{1, 2, 3}})));
+    EXPECT_TRUE(sameSize(mat({{1, 2}, {2, 4}}).getInversedMatrix_Pseudo(), 0, 0));
+    EXPECT_TRUE(mat({{kNan, 1}, {1, 1}}).getInversedMatrix(R)) << "NaN is not zero";
+}
+
+TEST(Inverse, OfMatricesWithMoreRowsThanColumns) {
+    EXPECT_TRUE(same(mat({{1, 0}, {0, 1}, {0, 0}}).getInversedMatrix_Pseudo(), mat({{1, 0, 0}, {0, 1, 0}})));
+    for (const auto& size : {std::pair<int, int>{7, 2}, {9, 3}, {20, 5}, {200, 9}, {4, 4}}) {
+        const kelMat A = randomMatrix(size.first, size.second, 33);
+        kelMat R;
+        ASSERT_TRUE(A.getInversedMatrix_Pseudo(R));
+        EXPECT_TRUE(near(R * A, identity(size.second), 2e-3));
+        const Reference a = reference(A), t = kel_ref::transposed(a);
+        if (size.second > 3) {
+            Reference q;
+            kel_ref::inverse(kel_ref::product(t, a), q);
+            EXPECT_TRUE(same(R, kel_ref::product(q, t)));
+        }
+    }
+}
+
+TEST(Inverse, StopsOnSizesThatHaveNone) {
+    kelMat R;
+    const char *const square = "this->m_Width == this->m_Height", *const two = "2 <= this->m_Width",
+                      *const determinant = "float kelMat::getDeterminant() const",
+                      *const inverse = "bool kelMat::getInversedMatrix(kelMat&) const";
+    EXPECT_STOPS(kelMat(2, 3).getDeterminant(), square, kFile, determinant);
+    EXPECT_STOPS(kelMat(1, 1).getDeterminant(), two, kFile, determinant);
+    EXPECT_STOPS(kelMat().getDeterminant(), two, kFile, determinant);
+    EXPECT_STOPS(kelMat(2, 3).getInversedMatrix(R), square, kFile, inverse);
+    EXPECT_STOPS(kelMat(2, 3).getInversedMatrix(), square, kFile, inverse);
+    EXPECT_STOPS(kelMat(1, 1).getInversedMatrix(), two, kFile, inverse);
+    EXPECT_STOPS(kelMat(5, 1).getInversedMatrix_Pseudo(R), two, kFile, inverse);
+    EXPECT_STOPS(kelMat().getInversedMatrix_Pseudo(), two, kFile, inverse);
+}
+
+TEST(DecompositionMemory, HoldsNothingOnAnyPath) {
+    if (!kOwnMalloc)
+        GTEST_SKIP() << "the sanitizer counts instead";
+    for (int n : {2, 3, 4, 9, 20}) {
+        kelMat regular = randomMatrix(n, n, 34), symmetric = randomSymmetric(n, 35), zeroRow(regular), notDefinite(n, n);
+        kelMat definite = regular * regular.getTransposedMatrix();
+        std::fill_n(zeroRow[n - 1], n, 0.0f);
+        const CountedMemory memory;
+        {
+            kelMat A, R, T;
+            for (const kelMat* M : {&regular, &zeroRow}) {
+                M->getDecomposedMatrix_LU(A, R);
+                M->getDeterminant();
+                M->getInversedMatrix(A);
+                M->getInversedMatrix_Pseudo(A);
+                M->getDecomposedMatrix_SV(A, R, T);
+            }
+            symmetric.getEigenValue(A, R);
+            symmetric.getGeneralizedEigenValue(definite, A, R);
+            symmetric.getGeneralizedEigenValue(notDefinite, A, R);
+            kelMat poisoned(symmetric);
+            poisoned[0][0] = kNan;
+            poisoned.getEigenValue(A, R);
+            EXPECT_FALSE(poisoned.getDecomposedMatrix_SV(A, R, T));
+        }
+        EXPECT_EQ(memory.held(), 0) << n;
+    }
+}
+
+TEST(DecompositionMemory, KeepsSmallTemporariesOffTheHeap) {
+    if (!kOwnMalloc)
+        GTEST_SKIP() << "the sanitizer counts instead";
+    for (int n : {2, 3, 4, 9, 12}) {
+        kelMat M = randomSymmetric(n, 36), B = M * M + identity(n);
+        const auto allocations = [](auto operation) {
+            kelMat A, R, T;
+            const CountedMemory memory;
+            operation(A, R, T);
+            return memory.allocated();
+        };
+        EXPECT_EQ(allocations([&](kelMat&, kelMat&, kelMat&) { M.getDeterminant(); }), 0);
+        EXPECT_EQ(allocations([&](kelMat& R, kelMat&, kelMat&) { M.getInversedMatrix(R); }), 1);
+        EXPECT_EQ(allocations([&](kelMat& L, kelMat& U, kelMat&) { M.getDecomposedMatrix_LU(L, U); }), 2);
+        EXPECT_EQ(allocations([&](kelMat& U, kelMat& W, kelMat& V) { M.getDecomposedMatrix_SV(U, W, V); }), 3);
+        EXPECT_EQ(allocations([&](kelMat& d, kelMat& v, kelMat&) { M.getEigenValue(d, v); }), 2);
+        EXPECT_EQ(allocations([&](kelMat& d, kelMat& X, kelMat&) { M.getGeneralizedEigenValue(B, d, X); }), 7);
+        EXPECT_EQ(allocations([&](kelMat& R, kelMat&, kelMat&) { M.getInversedMatrix_Pseudo(R); }), 3);
+    }
+}

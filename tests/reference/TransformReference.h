@@ -1,0 +1,205 @@
+// Plain references of resizing, borders, flips and warp, a pixel at a time over bytes.
+#ifndef KEL_TESTS_TRANSFORM_REFERENCE_H
+#define KEL_TESTS_TRANSFORM_REFERENCE_H
+
+#include <algorithm>
+#include <cmath>
+#include <cstdint>
+#include <cstring>
+#include <kel/kelImage.h>
+#include <vector>
+
+namespace kel_ref {
+
+// Bytes of a pixel that is moved as a whole; 0 for the types that are ignored.
+inline int wholePixelBytes(int type) {
+    switch (type) {
+    case 0:
+        return 1;
+    case 3:
+        return 2;
+    case 8:
+    case 24:
+        return 3;
+    case 16:
+    case 32:
+        return 4;
+    default:
+        return 0;
+    }
+}
+
+inline void copyPixel(kelImage_t* dst, ptrdiff_t to, const kelImage_t* src, ptrdiff_t from) {
+    const int bytes = wholePixelBytes(dst->type);
+    std::memcpy(dst->data + to * bytes, src->data + from * bytes, bytes);
+}
+
+inline void nearest(kelImage_t* dst, const kelImage_t* src) {
+    const float rx = static_cast<float>(src->width / dst->width), ry = static_cast<float>(src->height / dst->height);
+    for (int y = 0; y < dst->height; ++y)
+        for (int x = 0; x < dst->width; ++x) {
+            const int sx = static_cast<int>((x + 0.5f) * rx), sy = static_cast<int>((y + 0.5f) * ry);
+            copyPixel(dst, y * dst->width + x, src, sy * src->width + sx);
+        }
+}
+
+inline void bilinear(kelImage_t* dst, const kelImage_t* src) {
+    const float rx = static_cast<float>(src->width / dst->width), ry = static_cast<float>(src->height / dst->height);
+    if (dst->type != 0)
+        return;
+    for (int y = 0; y < dst->height; ++y)
+        for (int x = 0; x < dst->width; ++x) {
+            const float fx = (x + 0.5f) * rx, fy = (y + 0.5f) * ry;
+            const int ix = static_cast<int>(fx), iy = static_cast<int>(fy);
+            const float wx = fx - ix, wy = fy - iy;
+            const int ix1 = ix == src->width - 1 ? ix : ix + 1, iy1 = iy == src->height - 1 ? iy : iy + 1;
+            const auto s = [&](int i, int j) { return static_cast<float>(src->data[j * src->width + i]); };
+            const float v =
+                (s(ix, iy) * (1 - wx) + s(ix1, iy) * wx) * (1 - wy) + (s(ix, iy1) * (1 - wx) + s(ix1, iy1) * wx) * wy;
+            dst->data[y * dst->width + x] = static_cast<uint8_t>(static_cast<int>(v + 0.5f));
+        }
+}
+
+inline void half(kelImage_t* dst, const kelImage_t* src) {
+    for (int y = 0; y < dst->height; ++y)
+        for (int x = 0; x < dst->width; ++x)
+            copyPixel(dst, y * dst->step + x, src, 2 * y * src->step + 2 * x);
+}
+
+inline int greatestCommonDivisor(int x, int y) {
+    return y == 0 ? x : greatestCommonDivisor(y, x % y);
+}
+
+inline void linearInterpolation(kelImage_t* dst, const kelImage_t* src) {
+    const int Dw = dst->width, Dh = dst->height, Sw = src->width, Sh = src->height;
+    const auto tables = [](int D, int S, std::vector<int>& f, std::vector<int>& adv) {
+        const int g = greatestCommonDivisor(D, S), a = D / g, b = S / g;
+        int k = 0;
+        for (int i = 0; i < D; ++i) {
+            f.push_back(i * b % a * 256 / a);
+            adv.push_back((k + 1) * a <= i * b);
+            k += adv.back();
+        }
+    };
+    std::vector<int> fx, advx, fy, advy;
+    tables(Dw, Sw, fx, advx);
+    tables(Dh, Sh, fy, advy);
+    std::vector<int> B(static_cast<size_t>(Sh + 1) * Dw * 4);
+    for (int r = 0; r < Sh; ++r)
+        for (int i = 0, q = 0; i < Dw; ++i) {
+            q += advx[i];
+            const uint8_t* const p = src->data + (r * Sw + q) * 4;
+            for (int c = 0; c < 3; ++c)
+                B[(r * Dw + i) * 4 + c] = ((256 - fx[i]) * p[c] + fx[i] * p[4 + c]) >> 8;
+        }
+    std::copy(B.end() - 8 * Dw, B.end() - 4 * Dw, B.end() - 4 * Dw);
+    for (int i = 0; i < Dw; ++i)
+        for (int j = 0, q = 0; j < Dh; ++j) {
+            q += advy[j];
+            for (int c = 0; c < 4; ++c) {
+                const int upper = B[(q * Dw + i) * 4 + c], lower = B[((q + 1) * Dw + i) * 4 + c];
+                dst->data[(j * Dw + i) * 4 + c] = static_cast<uint8_t>((lower * fy[j] + upper * (256 - fy[j])) >> 8);
+            }
+        }
+}
+
+inline void zeroOrderHoldPlusAverage(kelImage_t* dst, const kelImage_t* src) {
+    const int Dw = dst->width, Dh = dst->height, Sw = src->width, Sh = src->height;
+    const int a = Dw / greatestCommonDivisor(Dw, Sw), b = Sw / greatestCommonDivisor(Dw, Sw);
+    const int c = Dh / greatestCommonDivisor(Dh, Sh), d = Sh / greatestCommonDivisor(Dh, Sh);
+    std::vector<uint8_t> w(src->data, src->data + static_cast<size_t>(Sw) * Sh * 4);
+    for (int channel = 0; channel < 4; ++channel) {
+        for (int r = 0; r < Sh; ++r) {
+            std::vector<int> held;
+            for (int k = 0; k < Sw; ++k)
+                held.insert(held.end(), a, w[(r * Sw + k) * 4 + channel]);
+            for (int j = 0; j < Dw; ++j) {
+                int sum = 0;
+                for (int t = j * b; t < j * b + b; ++t)
+                    sum += held[t];
+                w[(r * Sw + j) * 4 + channel] = static_cast<uint8_t>(sum / b);
+            }
+        }
+        for (int x = 0; x < Dw; ++x) {
+            std::vector<int> held;
+            for (int k = 0; k < Sh; ++k)
+                held.insert(held.end(), c, w[(k * Sw + x) * 4 + channel]);
+            for (int y = 0; y < Dh; ++y) {
+                int sum = 0;
+                for (int t = y * d; t < y * d + d; ++t)
+                    sum += held[t];
+                dst->data[(y * Dw + x) * 4 + channel] = static_cast<uint8_t>(sum / d);
+            }
+        }
+    }
+}
+
+inline void enborder(kelImage_t* dst, const kelImage_t* src, int size) {
+    const int bytes = wholePixelBytes(dst->type), Sw = src->width, Sh = src->height;
+    if (bytes == 0)
+        return;
+    const ptrdiff_t ds = bytes <= 2 ? dst->step : dst->width, ss = bytes <= 2 ? src->step : src->width;
+    for (int y = 0; y < Sh; ++y)
+        for (int x = 0; x < Sw; ++x)
+            copyPixel(dst, (y + size) * ds + x + size, src, y * ss + x);
+    for (int r = 0; r < size; ++r)
+        for (int x = 0; x < Sw; ++x) {
+            copyPixel(dst, r * ds + x + size, src, x);
+            copyPixel(dst, (Sh + size + r) * ds + x + size, src, (Sh - 1) * ss + x);
+        }
+    for (int r = 0; r < Sh + 2 * size; ++r)
+        for (int x = 0; x < size; ++x)
+            copyPixel(dst, r * ds + x, dst, r * ds + size);
+    const ptrdiff_t base = bytes == 2 ? src->step : Sw;
+    for (int r = 0; r < Sh + 2 * size; ++r)
+        for (int x = 0; x < size; ++x) {
+            const ptrdiff_t to = r * ds + base + size + x;
+            if ((to + 1) * bytes <= dst->size)
+                copyPixel(dst, to, dst, r * ds + base + size - 1);
+        }
+}
+
+inline void deborder(kelImage_t* dst, const kelImage_t* src, int size) {
+    for (int y = 0; y < dst->height; ++y)
+        for (int x = 0; x < dst->width; ++x)
+            copyPixel(dst, y * dst->step + x, src, (y + size) * src->step + x + size);
+}
+
+inline void flip(kelImage_t* dst, const kelImage_t* src, bool mirrored, bool upsideDown) {
+    for (int y = 0; y < dst->height; ++y)
+        for (int x = 0; x < dst->width; ++x)
+            copyPixel(dst, y * dst->step + x, src,
+                      (upsideDown ? dst->height - 1 - y : y) * src->step + (mirrored ? dst->width - 1 - x : x));
+}
+
+// Truncation toward zero; -1 where the value is no int.
+inline int truncated(float value) {
+    return value > -2147483648.0f && value < 2147483648.0f ? static_cast<int>(value) : -1;
+}
+
+inline void warp(kelImage_t* dst, const kelImage_t* src, const float* h) {
+    const int bytes = wholePixelBytes(dst->type);
+    if (bytes == 0)
+        return;
+    for (int y = 0; y < dst->height; ++y)
+        for (int x = 0; x < dst->width; ++x) {
+            const bool centred = dst->type == 0;
+            const float u = centred ? x + 0.5f : x, v = centred ? y + 0.5f : y;
+            const float w = (h[6] * u + h[7] * v) + h[8];
+            float qx = ((h[0] * u + h[1] * v) + h[2]) / w, qy = ((h[3] * u + h[4] * v) + h[5]) / w;
+            if (!centred) {
+                qx = qx + 0.5f;
+                qy = qy + 0.5f;
+            }
+            const int sx = truncated(qx), sy = truncated(qy);
+            const ptrdiff_t to = static_cast<ptrdiff_t>(y) * dst->step + x;
+            if (sx >= 0 && sy >= 0 && sx < src->width && sy < src->height)
+                copyPixel(dst, to, src, static_cast<ptrdiff_t>(sy) * src->step + sx);
+            else
+                std::memset(dst->data + to * bytes, 0, bytes);
+        }
+}
+
+} // namespace kel_ref
+
+#endif
