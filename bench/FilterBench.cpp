@@ -54,10 +54,18 @@ struct Desk {
                        static_cast<size_t>(image->step * image->channels * image->depth));
     }
     // Results go into kel's own images: the peers allocate nothing either.
-    cv::Mat in() const { return mat(src, CV_8UC1); }
-    cv::Mat out() const { return mat(dst, CV_8UC1); }
-    cv::Mat halfOut() const { return mat(half, CV_8UC1); }
-    cv::Mat outS16() const { return mat(response, CV_16SC1); }
+    cv::Mat in() const {
+        return mat(src, CV_8UC1);
+    }
+    cv::Mat out() const {
+        return mat(dst, CV_8UC1);
+    }
+    cv::Mat halfOut() const {
+        return mat(half, CV_8UC1);
+    }
+    cv::Mat outS16() const {
+        return mat(response, CV_16SC1);
+    }
 #endif
 };
 
@@ -116,9 +124,11 @@ void frontEnd(Desk& d) {
     cv::Laplacian(out, response, CV_16S, 1);
     cv::FAST(out, d.corners, 20);
 }
-#define KEL_PEERS(...) {__VA_ARGS__}
+#define KEL_PEERS(...)                                                                                                         \
+    { __VA_ARGS__ }
 #else
-#define KEL_PEERS(...) {}
+#define KEL_PEERS(...)                                                                                                         \
+    {}
 #endif
 
 // clang-format off
