@@ -15,43 +15,60 @@ size_t elements(const kelMat& M) {
     return static_cast<size_t>(M.m_Height) * static_cast<size_t>(M.m_Width);
 }
 
+void markEmpty(kelMat& M) {
+    M.m_Width = 0;
+    M.m_Height = 0;
+    M.m_Data = nullptr;
+    M.m_IsCreated = false;
+}
+
+// Gives storage to an empty matrix, if the size is positive.
+void allocate(kelMat& M, int height, int width) {
+    if (width < 1 || height < 1)
+        return;
+    M.m_Height = height;
+    M.m_Width = width;
+    M.m_Data = static_cast<float*>(malloc(elements(M) * sizeof(float)));
+    M.m_IsCreated = true;
+}
+
+void copyElements(kelMat& to, const kelMat& from) {
+    std::copy_n(from.m_Data, elements(from), to.m_Data);
+}
+
 } // namespace
 
 // ---- storage ---------------------------------------------------------------------------------------------------------------
 
-kelMat::kelMat(int height, int width, bool zero) : m_IsCreated(false), m_Data(nullptr) {
-    create(height, width, zero);
+kelMat::kelMat(int height, int width, bool zero) {
+    markEmpty(*this);
+    allocate(*this, height, width);
+    if (zero)
+        setDataZero();
 }
 
-kelMat::kelMat(const kelMat& M) : m_IsCreated(false), m_Data(nullptr) {
-    create(M.m_Height, M.m_Width, false);
-    std::copy_n(M.m_Data, elements(M), m_Data);
+kelMat::kelMat(const kelMat& M) {
+    markEmpty(*this);
+    allocate(*this, M.m_Height, M.m_Width);
+    copyElements(*this, M);
 }
 
 kelMat::~kelMat() {
-    release();
+    free(m_Data);
 }
 
 float* kelMat::create(int height, int width, bool zero) {
-    release();
-    if (width > 0 && height > 0) {
-        m_Height = height;
-        m_Width = width;
-        m_Data = static_cast<float*>(malloc(elements(*this) * sizeof(float)));
-        m_IsCreated = true;
-        if (zero)
-            setDataZero();
-    }
+    free(m_Data);
+    markEmpty(*this);
+    allocate(*this, height, width);
+    if (zero)
+        setDataZero();
     return m_Data;
 }
 
 void kelMat::release() {
-    if (m_Data)
-        free(m_Data);
-    m_Width = 0;
-    m_Height = 0;
-    m_Data = nullptr;
-    m_IsCreated = false;
+    free(m_Data);
+    markEmpty(*this);
 }
 
 void kelMat::resize(int height, int width, bool zero) {
@@ -62,7 +79,7 @@ void kelMat::resize(int height, int width, bool zero) {
 
 kelMat& kelMat::operator=(const kelMat& M) {
     create(M.m_Height, M.m_Width, false);
-    std::copy_n(M.m_Data, elements(M), m_Data);
+    copyElements(*this, M);
     return *this;
 }
 
@@ -128,12 +145,17 @@ void kelMat::print(const char* name) {
 
 namespace {
 
-// A matrix of M's size with f(i) as its i-th element in storage order.
-template <class F> kelMat elementwise(const kelMat& M, F f) {
-    kelMat R(M.m_Height, M.m_Width, false);
-    float* const r = R.m_Data;
-    for (size_t i = 0, n = elements(M); i < n; ++i)
-        r[i] = f(i);
+// The matrix of f(a) for the elements a of A.
+template <class F> kelMat elementwise(const kelMat& A, F f) {
+    kelMat R(A.m_Height, A.m_Width, false);
+    std::transform(A.m_Data, A.m_Data + elements(A), R.m_Data, f);
+    return R;
+}
+
+// The matrix of f(a, b) for the elements of A and B, which have one size.
+template <class F> kelMat elementwise(const kelMat& A, const kelMat& B, F f) {
+    kelMat R(A.m_Height, A.m_Width, false);
+    std::transform(A.m_Data, A.m_Data + elements(A), B.m_Data, R.m_Data, f);
     return R;
 }
 
@@ -144,15 +166,15 @@ bool bothCreated(const kelMat& A, const kelMat& B) {
 } // namespace
 
 kelMat kelMat::operator+(float v) const {
-    return elementwise(*this, [=](size_t i) { return m_Data[i] + v; });
+    return elementwise(*this, [v](float a) { return a + v; });
 }
 
 kelMat kelMat::operator-(float v) const {
-    return elementwise(*this, [=](size_t i) { return m_Data[i] - v; });
+    return elementwise(*this, [v](float a) { return a - v; });
 }
 
 kelMat kelMat::operator*(float v) const {
-    return elementwise(*this, [=](size_t i) { return m_Data[i] * v; });
+    return elementwise(*this, [v](float a) { return a * v; });
 }
 
 kelMat kelMat::operator/(float v) const {
@@ -163,14 +185,14 @@ kelMat kelMat::operator+(const kelMat& M) const {
     if (!bothCreated(*this, M))
         return kelMat(0, 0, true);
     KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
-    return elementwise(*this, [&](size_t i) { return m_Data[i] + M.m_Data[i]; });
+    return elementwise(*this, M, [](float a, float b) { return a + b; });
 }
 
 kelMat kelMat::operator-(const kelMat& M) const {
     if (!bothCreated(*this, M))
         return kelMat(0, 0, true);
     KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
-    return elementwise(*this, [&](size_t i) { return m_Data[i] - M.m_Data[i]; });
+    return elementwise(*this, M, [](float a, float b) { return a - b; });
 }
 
 kelMat kelMat::operator*(const kelMat& M) const {
@@ -224,8 +246,8 @@ float kelMat::getNorm() const {
 float kelMat::getTrace() const {
     KEL_ASSERT(this->m_Height == this->m_Width);
     float sum = 0.0f; // of squares: callers rely on the length of the diagonal, not on its sum
-    for (int i = 0; i < m_Width; ++i)
-        sum += (*this)[i][i] * (*this)[i][i];
+    for (size_t i = 0, n = elements(*this); i < n; i += m_Width + 1)
+        sum += m_Data[i] * m_Data[i];
     return sqrtf(sum);
 }
 
@@ -250,27 +272,24 @@ int rounded(float f) {
 
 void kelMat::cvtPoint(float x, float y, float* u, float* v) {
     KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
-    const kelMat& M = *this;
-    const float s = 1.0f / rowTimes(M[2], x, y);
-    *u = rowTimes(M[0], x, y) * s;
-    *v = rowTimes(M[1], x, y) * s;
+    const float s = 1.0f / rowTimes(m_Data + 6, x, y);
+    *u = rowTimes(m_Data, x, y) * s;
+    *v = rowTimes(m_Data + 3, x, y) * s;
 }
 
 void kelMat::cvtPoint(float x, float y, float z, float* u, float* v) {
     KEL_ASSERT(this->m_Width == 4 && this->m_Height == 3);
-    const kelMat& M = *this;
-    const float s = 1.0f / rowTimes(M[2], x, y, z);
-    *u = rowTimes(M[0], x, y, z) * s;
-    *v = rowTimes(M[1], x, y, z) * s;
+    const float s = 1.0f / rowTimes(m_Data + 8, x, y, z);
+    *u = rowTimes(m_Data, x, y, z) * s;
+    *v = rowTimes(m_Data + 4, x, y, z) * s;
 }
 
 void kelMat::cvtPoint(float x, float y, float z, float* X, float* Y, float* Z) {
     KEL_ASSERT(this->m_Width == 4 && this->m_Height == 4);
-    const kelMat& M = *this;
-    const float s = 1.0f / rowTimes(M[3], x, y, z);
-    *X = rowTimes(M[0], x, y, z) * s;
-    *Y = rowTimes(M[1], x, y, z) * s;
-    *Z = rowTimes(M[2], x, y, z) * s;
+    const float s = 1.0f / rowTimes(m_Data + 12, x, y, z);
+    *X = rowTimes(m_Data, x, y, z) * s;
+    *Y = rowTimes(m_Data + 4, x, y, z) * s;
+    *Z = rowTimes(m_Data + 8, x, y, z) * s;
 }
 
 void kelMat::cvtPoint(int x, int y, int* u, int* v) {

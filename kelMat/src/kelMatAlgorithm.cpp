@@ -2,19 +2,65 @@
 // need. Every element's own sum runs in the order that the textbook algorithms have, whatever the loops around it look like.
 #include <algorithm>
 #include <math.h>
+#include <smmintrin.h>
 
 #include "kelMat_Private.h"
+
+namespace {
+
+constexpr int kLanes = 4;
+
+// Rows x (4 Vectors) elements of a product, summed in registers. The rows of A are `inner` apart, those of B and R `columns`.
+template <int Rows, int Vectors>
+void multiplyBlock(float* R, const float* A, const float* B, ptrdiff_t inner, ptrdiff_t columns) {
+    __m128 sums[Rows][Vectors];
+    for (auto& row : sums)
+        for (__m128& sum : row)
+            sum = _mm_setzero_ps();
+    for (ptrdiff_t k = 0; k < inner; ++k, B += columns)
+        for (int i = 0; i < Rows; ++i) {
+            const __m128 a = _mm_set1_ps(A[i * inner + k]);
+            for (int v = 0; v < Vectors; ++v)
+                sums[i][v] = _mm_add_ps(_mm_mul_ps(a, _mm_loadu_ps(B + kLanes * v)), sums[i][v]);
+        }
+    for (int i = 0; i < Rows; ++i)
+        for (int v = 0; v < Vectors; ++v)
+            _mm_storeu_ps(R + i * columns + kLanes * v, sums[i][v]);
+}
+
+// The columns that do not fill a vector.
+template <int Rows> void multiplyColumn(float* R, const float* A, const float* B, ptrdiff_t inner, ptrdiff_t columns) {
+    float sums[Rows] = {};
+    for (ptrdiff_t k = 0; k < inner; ++k, B += columns)
+        for (int i = 0; i < Rows; ++i)
+            sums[i] = A[i * inner + k] * *B + sums[i];
+    for (int i = 0; i < Rows; ++i)
+        R[i * columns] = sums[i];
+}
+
+template <int Rows> void multiplyRows(float* R, const float* A, const float* B, ptrdiff_t inner, ptrdiff_t columns) {
+    ptrdiff_t j = 0;
+    for (; j + 2 * kLanes <= columns; j += 2 * kLanes)
+        multiplyBlock<Rows, 2>(R + j, A, B + j, inner, columns);
+    for (; j + kLanes <= columns; j += kLanes)
+        multiplyBlock<Rows, 1>(R + j, A, B + j, inner, columns);
+    for (; j < columns; ++j)
+        multiplyColumn<Rows>(R + j, A, B + j, inner, columns);
+}
+
+} // namespace
 
 namespace kel {
 
 void multiply(float* R, const float* A, const float* B, int rows, int inner, int columns) {
-    for (int i = 0; i < rows; ++i, A += inner, R += columns) {
-        std::fill_n(R, columns, 0.0f);
-        const float* b = B;
-        for (int k = 0; k < inner; ++k, b += columns)
-            for (int j = 0; j < columns; ++j)
-                R[j] = A[k] * b[j] + R[j];
-    }
+    for (; rows >= 4; rows -= 4, A += 4 * static_cast<ptrdiff_t>(inner), R += 4 * static_cast<ptrdiff_t>(columns))
+        multiplyRows<4>(R, A, B, inner, columns);
+    if (rows == 3)
+        multiplyRows<3>(R, A, B, inner, columns);
+    else if (rows == 2)
+        multiplyRows<2>(R, A, B, inner, columns);
+    else if (rows == 1)
+        multiplyRows<1>(R, A, B, inner, columns);
 }
 
 void transpose(float* T, const float* A, int rows, int columns) {
@@ -41,12 +87,11 @@ namespace {
 constexpr float kTinyPivot = 1.0e-40f;
 
 // The reciprocal of the largest magnitude of each row; false for a row of zeros.
-bool rowScales(const kelMat& a, float* scales) {
-    const int n = a.m_Width;
-    for (int i = 0; i < n; ++i) {
+bool rowScales(const float* a, int n, float* scales) {
+    for (int i = 0; i < n; ++i, a += n) {
         float largest = 0.0f;
         for (int j = 0; j < n; ++j)
-            if (const float magnitude = fabsf(a[i][j]); magnitude > largest)
+            if (const float magnitude = fabsf(a[j]); magnitude > largest)
                 largest = magnitude;
         if (largest == 0.0f)
             return false;
@@ -55,12 +100,52 @@ bool rowScales(const kelMat& a, float* scales) {
     return true;
 }
 
-// a[i][j] less the products of row i and column j up to `count`, subtracted one at a time.
-float reduced(const kelMat& a, int i, int j, int count) {
-    float sum = a[i][j];
-    for (int k = 0; k < count; ++k)
-        sum -= a[i][k] * a[k][j];
-    return sum;
+// Picks the pivot of column j among the rows from j on, the last of equals, and brings it to its place; a column without a
+// candidate (all NaN) takes over the row of the column before. Then divides the column below by the pivot.
+void pivot(float* a, int n, int j, float* scales, int* row, int* indx, float* d) {
+    float best = 0.0f;
+    for (int i = j; i < n; ++i) {
+        const float candidate = scales[i] * fabsf(a[i * n + j]);
+        if (candidate >= best) {
+            best = candidate;
+            *row = i;
+        }
+    }
+    if (*row != j) {
+        std::swap_ranges(a + *row * n, a + (*row + 1) * n, a + j * n);
+        *d = -*d;
+        scales[*row] = scales[j];
+    }
+    indx[j] = *row;
+    float& diagonal = a[j * n + j];
+    if (diagonal == 0.0f)
+        diagonal = kTinyPivot;
+    const float reciprocal = 1.0f / diagonal;
+    for (int i = j + 1; i < n; ++i)
+        a[i * n + j] *= reciprocal;
+}
+
+// Crout's order: a column gets the products of the columns before it when its turn comes.
+void decomposeByColumns(float* a, int n, float* scales, int* indx, float* d) {
+    for (int j = 0, row = 0; j < n; ++j) {
+        for (int i = 1; i < n; ++i)
+            for (int k = 0; k < std::min(i, j); ++k)
+                a[i * n + j] -= a[i * n + k] * a[k * n + j];
+        pivot(a, n, j, scales, &row, indx, d);
+    }
+}
+
+// The same sums row by row: each pivot row is subtracted from all rows below it at once. That is the same as long as no row
+// that is finished returns as a pivot, which takes a column of NaN; false then.
+bool decomposeByRows(float* a, int n, float* scales, int* indx, float* d) {
+    for (int j = 0, row = 0; j < n; ++j) {
+        pivot(a, n, j, scales, &row, indx, d);
+        if (row < j)
+            return false;
+        for (int i = j + 1; i < n; ++i)
+            kel::subtractMultiple(a + i * n + j + 1, a[i * n + j], a + j * n + j + 1, n - j - 1);
+    }
+    return true;
 }
 
 } // namespace
@@ -69,54 +154,38 @@ bool nr_ludcmp(kelMat& a, int* indx, float* d) {
     const int n = a.m_Width;
     *d = 1.0f;
     kel::Scratch<float, kel::kSmallOrder> scales(n);
-    if (!rowScales(a, scales.data()))
+    if (!rowScales(a.m_Data, n, scales.data()))
         return false;
-    int pivot = 0; // a column that has no candidate (all NaN) takes over the row of the column before
-    for (int j = 0; j < n; ++j) {
-        for (int i = 0; i < j; ++i)
-            a[i][j] = reduced(a, i, j, i);
-        float best = 0.0f;
-        for (int i = j; i < n; ++i) {
-            a[i][j] = reduced(a, i, j, j);
-            const float candidate = scales[i] * fabsf(a[i][j]);
-            if (candidate >= best) { // the last of equals
-                best = candidate;
-                pivot = i;
-            }
-        }
-        if (pivot != j) {
-            std::swap_ranges(a[pivot], a[pivot] + n, a[j]);
-            *d = -*d;
-            scales[pivot] = scales[j];
-        }
-        indx[j] = pivot;
-        if (a[j][j] == 0.0f)
-            a[j][j] = kTinyPivot;
-        const float reciprocal = 1.0f / a[j][j];
-        for (int i = j + 1; i < n; ++i)
-            a[i][j] *= reciprocal;
-    }
+    kel::SmallMat before(a);
+    if (decomposeByRows(a.m_Data, n, scales.data(), indx, d))
+        return true;
+    *d = 1.0f;
+    a.setData(before.m_Data);
+    rowScales(a.m_Data, n, scales.data());
+    decomposeByColumns(a.m_Data, n, scales.data(), indx, d);
     return true;
 }
 
 bool nr_lubksb(kelMat& a, int* indx, float* b) {
     const int n = a.m_Width;
+    const float* row = a.m_Data;
     int first = -1; // the first element of b that is not zero, once met
-    for (int i = 0; i < n; ++i) {
+    for (int i = 0; i < n; ++i, row += n) {
         float sum = b[indx[i]];
         b[indx[i]] = b[i];
         if (first >= 0)
             for (int k = first; k < i; ++k)
-                sum -= a[i][k] * b[k];
+                sum -= row[k] * b[k];
         else if (sum != 0.0f)
             first = i;
         b[i] = sum;
     }
     for (int i = n - 1; i >= 0; --i) {
+        row -= n;
         float sum = b[i];
         for (int k = i + 1; k < n; ++k)
-            sum -= a[i][k] * b[k];
-        b[i] = sum / a[i][i];
+            sum -= row[k] * b[k];
+        b[i] = sum / row[i];
     }
     return true;
 }
@@ -126,22 +195,26 @@ bool nr_lubksb(kelMat& a, int* indx, float* b) {
 // First L D L^T with the products D L^T kept in the lower triangle, then every column divided by the root of its pivot.
 bool nr_choldc(kelMat& a) {
     const int n = a.m_Width;
-    for (int i = 0; i < n; ++i)
+    float* const A = a.m_Data;
+    for (int i = 0; i < n; ++i) {
+        float* const row = A + i * n;
         for (int j = 0; j <= i; ++j) {
-            float sum = a[i][j];
+            const float* const other = A + j * n;
+            float sum = row[j];
             for (int k = 0; k < j; ++k)
-                sum -= a[i][k] * a[j][k] / a[k][k];
+                sum -= row[k] * other[k] / A[k * n + k];
             if (j == i && 0.0f >= sum)
                 return false;
-            a[i][j] = sum;
+            row[j] = sum;
         }
+    }
     for (int i = 0; i < n; ++i)
-        a[i][i] = sqrtf(a[i][i]);
-    for (int i = 1; i < n; ++i)
+        A[i * n + i] = sqrtf(A[i * n + i]);
+    for (int i = 0; i < n; ++i) {
         for (int j = 0; j < i; ++j)
-            a[i][j] /= a[j][j];
-    for (int i = 0; i < n; ++i)
-        std::fill(a[i] + i + 1, a[i] + n, 0.0f);
+            A[i * n + j] /= A[j * n + j];
+        std::fill(A + i * n + i + 1, A + (i + 1) * n, 0.0f);
+    }
     return true;
 }
 
@@ -166,18 +239,14 @@ bool vanishes(float g, float x) {
     return magnitude + static_cast<double>(g) == magnitude;
 }
 
-void rotateJacobi(float& x, float& y, float s, float tau) {
-    const float g = x, h = y;
-    x = g - s * (h + g * tau);
-    y = h + s * (g - h * tau);
-}
-
-float offDiagonalSum(const kelMat& a) {
-    float sum = 0.0f;
-    for (int p = 0; p < a.m_Width - 1; ++p)
-        for (int q = p + 1; q < a.m_Width; ++q)
-            sum += fabsf(a[p][q]);
-    return sum;
+// The rotation g - s (h + g tau), h + s (g - h tau) of two rows, `count` a multiple of four.
+void rotateRows(float* x, float* y, ptrdiff_t count, float s, float tau) {
+    const __m128 S = _mm_set1_ps(s), Tau = _mm_set1_ps(tau);
+    for (ptrdiff_t i = 0; i < count; i += kLanes) {
+        const __m128 g = _mm_load_ps(x + i), h = _mm_load_ps(y + i);
+        _mm_store_ps(x + i, _mm_sub_ps(g, _mm_mul_ps(S, _mm_add_ps(h, _mm_mul_ps(g, Tau)))));
+        _mm_store_ps(y + i, _mm_add_ps(h, _mm_mul_ps(S, _mm_sub_ps(g, _mm_mul_ps(h, Tau)))));
+    }
 }
 
 // The tangent of the angle that takes `element` to zero, h the difference of its diagonal elements.
@@ -186,8 +255,100 @@ float rotationTangent(float element, float h, float g) {
         return element / h;
     const float theta = 0.5f * h / element;
     const float t = 1.0f / (fabsf(theta) + sqrtf(1.0f + theta * theta));
-    return theta < 0.0f ? -t : t;
+    const __m128 negative = _mm_cmplt_ss(_mm_set_ss(theta), _mm_setzero_ps()); // no branch: signs are unpredictable
+    return _mm_cvtss_f32(_mm_xor_ps(_mm_set_ss(t), _mm_and_ps(negative, _mm_set_ss(-0.0f))));
 }
+
+// The iteration on a symmetric matrix. Rows are kept whole, mirrored over the diagonal, and eigenvectors as rows, all padded to
+// fours, so that a rotation is that of two rows.
+class Jacobi {
+public:
+    Jacobi(const float* a, int n, float* d)
+        : n(n), m_pitch((n + kLanes - 1) / kLanes * kLanes), d(d), b(n), z(n), m_rows(n * m_pitch), m_vectors(n * m_pitch) {
+        std::fill_n(m_rows.data(), n * m_pitch, 0.0f);
+        std::fill_n(m_vectors.data(), n * m_pitch, 0.0f);
+        for (int i = 0; i < n; ++i) {
+            for (int j = i + 1; j < n; ++j)
+                row(i)[j] = row(j)[i] = a[static_cast<ptrdiff_t>(i) * n + j];
+            vector(i)[i] = 1.0f;
+            b[i] = d[i] = a[static_cast<ptrdiff_t>(i) * n + i];
+            z[i] = 0.0f;
+        }
+    }
+
+    bool run(int* rotations) {
+        for (int sweep = 0; sweep < kJacobiSweeps; ++sweep) {
+            const float sum = offDiagonalSum();
+            if (sum == 0.0f)
+                return true;
+            const float threshold = sweep < kThresholdSweeps ? 0.2f * sum / static_cast<float>(n * n) : 0.0f;
+            for (int p = 0; p < n - 1; ++p)
+                for (int q = p + 1; q < n; ++q)
+                    *rotations += visit(p, q, sweep > kShortcutSweep, threshold);
+            for (int i = 0; i < n; ++i) {
+                b[i] += z[i];
+                d[i] = b[i];
+                z[i] = 0.0f;
+            }
+        }
+        return false;
+    }
+
+    // The strict upper triangle back into a, the eigenvectors as columns into v.
+    void store(float* a, float* v) {
+        for (int i = 0; i < n; ++i) {
+            std::copy(row(i) + i + 1, row(i) + n, a + static_cast<ptrdiff_t>(i) * n + i + 1);
+            for (int j = 0; j < n; ++j)
+                v[static_cast<ptrdiff_t>(j) * n + i] = vector(i)[j];
+        }
+    }
+
+private:
+    const int n;
+    const ptrdiff_t m_pitch;
+    float* const d;
+    kel::Scratch<float, kel::kSmallOrder> b, z; // d at the start of the sweep, and what the sweep adds to it
+    kel::Scratch<float, kel::kSmallOrder * kel::kSmallOrder> m_rows, m_vectors;
+
+    float* row(int i) { return m_rows.data() + m_pitch * i; }
+    float* vector(int i) { return m_vectors.data() + m_pitch * i; }
+
+    float offDiagonalSum() {
+        float sum = 0.0f;
+        for (int p = 0; p < n - 1; ++p)
+            for (int q = p + 1; q < n; ++q)
+                sum += fabsf(row(p)[q]);
+        return sum;
+    }
+
+    // Takes element (p, q) to zero; whether that was by a rotation.
+    bool visit(int p, int q, bool shortcut, float threshold) {
+        float *const P = row(p), *const Q = row(q);
+        const float element = P[q], g = 100.0f * fabsf(element);
+        if (shortcut && vanishes(g, d[p]) && vanishes(g, d[q])) {
+            P[q] = Q[p] = 0.0f;
+            return false;
+        }
+        if (!(fabsf(element) > threshold))
+            return false;
+        const float t = rotationTangent(element, d[q] - d[p], g);
+        const float c = static_cast<float>(1.0 / sqrt(static_cast<double>(t * t + 1.0f)));
+        const float s = t * c, tau = s / (1.0f + c), h = t * element;
+        z[p] -= h;
+        z[q] += h;
+        d[p] -= h;
+        d[q] += h;
+        rotateRows(P, Q, m_pitch, s, tau);
+        P[q] = Q[p] = 0.0f;
+        float* mirror = m_rows.data();
+        for (int j = 0; j < n; ++j, mirror += m_pitch) {
+            mirror[p] = P[j];
+            mirror[q] = Q[j];
+        }
+        rotateRows(vector(p), vector(q), m_pitch, s, tau);
+        return true;
+    }
+};
 
 } // namespace
 
@@ -195,49 +356,9 @@ bool nr_jacobi(kelMat& a, kelMat& d, kelMat& v, int* nrot) {
     const int n = a.m_Width;
     d.create(n, 1, true);
     v.create(n, n, false);
-    v.setDataIdentity(1.0f);
-    kel::LocalMat<kel::kSmallOrder> b(n, 1), z(n, 1);
-    z.setDataZero();
-    for (int i = 0; i < n; ++i)
-        b[i][0] = d[i][0] = a[i][i];
     *nrot = 0;
-    for (int sweep = 0; sweep < kJacobiSweeps; ++sweep) {
-        const float sum = offDiagonalSum(a);
-        if (sum == 0.0f)
-            return true;
-        const float threshold = sweep < kThresholdSweeps ? 0.2f * sum / static_cast<float>(n * n) : 0.0f;
-        for (int p = 0; p < n - 1; ++p)
-            for (int q = p + 1; q < n; ++q) {
-                const float element = a[p][q], g = 100.0f * fabsf(element);
-                if (sweep > kShortcutSweep && vanishes(g, d[p][0]) && vanishes(g, d[q][0])) {
-                    a[p][q] = 0.0f;
-                    continue;
-                }
-                if (!(fabsf(element) > threshold))
-                    continue;
-                const float t = rotationTangent(element, d[q][0] - d[p][0], g);
-                const float c = static_cast<float>(1.0 / sqrt(static_cast<double>(t * t + 1.0f)));
-                const float s = t * c, tau = s / (1.0f + c), h = t * element;
-                z[p][0] -= h;
-                z[q][0] += h;
-                d[p][0] -= h;
-                d[q][0] += h;
-                a[p][q] = 0.0f;
-                for (int j = 0; j < p; ++j)
-                    rotateJacobi(a[j][p], a[j][q], s, tau);
-                for (int j = p + 1; j < q; ++j)
-                    rotateJacobi(a[p][j], a[j][q], s, tau);
-                for (int j = q + 1; j < n; ++j)
-                    rotateJacobi(a[p][j], a[q][j], s, tau);
-                for (int j = 0; j < n; ++j)
-                    rotateJacobi(v[j][p], v[j][q], s, tau);
-                ++*nrot;
-            }
-        for (int i = 0; i < n; ++i) {
-            b[i][0] += z[i][0];
-            d[i][0] = b[i][0];
-            z[i][0] = 0.0f;
-        }
-    }
-    return false;
+    Jacobi jacobi(a.m_Data, n, d.m_Data);
+    const bool converged = jacobi.run(nrot);
+    jacobi.store(a.m_Data, v.m_Data);
+    return converged;
 }

@@ -2,14 +2,16 @@
 #include "kelMat_Private.h"
 
 float kel_getDeterminant_2x2(const kelMat& A) {
-    return A[0][0] * A[1][1] - A[0][1] * A[1][0];
+    const float *const a = A.m_Data, *const b = a + 2;
+    return a[0] * b[1] - a[1] * b[0];
 }
 
 // Along the last column, summed from its top.
 float kel_getDeterminant_3x3(const kelMat& A) {
-    const float top = (A[1][0] * A[2][1] - A[1][1] * A[2][0]) * A[0][2];
-    const float middle = (A[2][0] * A[0][1] - A[2][1] * A[0][0]) * A[1][2] + top;
-    return (A[0][0] * A[1][1] - A[0][1] * A[1][0]) * A[2][2] + middle;
+    const float *const a = A.m_Data, *const b = a + 3, *const c = b + 3;
+    const float top = (b[0] * c[1] - b[1] * c[0]) * a[2];
+    const float middle = (c[0] * a[1] - c[1] * a[0]) * b[2] + top;
+    return (a[0] * b[1] - a[1] * b[0]) * c[2] + middle;
 }
 
 // A row of zeros leaves LU undone, with a zero on the diagonal all the same: no need to ask how it went.
@@ -19,7 +21,7 @@ float kel_getDeterminant_NxN(const kelMat& A) {
     kel::SmallMat LU(A);
     float det;
     nr_ludcmp(LU, indx.data(), &det);
-    for (int i = 0; i < n; ++i)
-        det = LU[i][i] * det;
+    for (ptrdiff_t i = 0; i < n; ++i)
+        det = LU.m_Data[i * n + i] * det;
     return det;
 }

@@ -6,6 +6,7 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdlib>
+#include <smmintrin.h>
 
 #include "kelMat.h"
 
@@ -74,6 +75,16 @@ inline float pythag(float a, float b) {
         return 0.0f;
     const float ratio = shorter / longer, q = ratio * ratio + 1.0f;
     return static_cast<float>(static_cast<double>(longer) * std::sqrt(static_cast<double>(q)));
+}
+
+// to[i] -= factor * from[i].
+inline void subtractMultiple(float* to, float factor, const float* from, ptrdiff_t count) {
+    const __m128 factors = _mm_set1_ps(factor);
+    ptrdiff_t i = 0;
+    for (; i + 4 <= count; i += 4)
+        _mm_storeu_ps(to + i, _mm_sub_ps(_mm_loadu_ps(to + i), _mm_mul_ps(factors, _mm_loadu_ps(from + i))));
+    for (; i < count; ++i)
+        to[i] -= factor * from[i];
 }
 
 // R = A B, A (rows x inner) and B (inner x columns) row by row without gaps, apart from R. Every element sums over `inner` in
