@@ -7,8 +7,6 @@
 
 #include "kelMat_Private.h"
 
-#define KEL_INLINE __attribute__((always_inline))
-
 namespace {
 
 using kel::Scratch;

@@ -10,6 +10,8 @@
 
 #include "kelMat.h"
 
+#define KEL_INLINE __attribute__((always_inline))
+
 namespace kel {
 
 // n elements of a plain type, indeterminate at first: inside the object up to N, from malloc beyond.
