@@ -324,31 +324,132 @@ KEL_API void binalizeKelImageAdaptiveSSE_U8G(kelImage_t* dst, const kelImage_t* 
  * Filters
  * ---------------------------------------------------------------------------------------------------------------- */
 
-/** Binomial smoothing, 5x5, optionally with every second sample into `half` (may be null). */
+/**
+ * @name Gaussian 5x5
+ * Binomial smoothing of a U8G image with w = (1, 4, 6, 4, 1) in both directions, rounded once:
+ *
+ *     tmp(x, y) = sum w[i] * src(x + i - 2, y)                    0..4080, in columns 2 .. W-3; 0 in the others
+ *     dst(x, y) = (sum w[i] * tmp(x, y + i - 2) + 128) >> 8       in columns 2 .. W-3 of rows 2 .. H-3; 0 in the others
+ *
+ * Every pixel of `dst` is written: a border two pixels wide comes out as zero. `half`, unless it is null, takes every
+ * second sample of every second row, half(x/2, y/2) = dst(x, y) for even x and y, zeros of the border included: it needs
+ * ceil(W/2) x ceil(H/2) U8G pixels. No padding is written in any image.
+ *
+ * `tmp` is S16G, at least as wide and high as `src`, and ends up holding the sums above; its size is not checked, nor is
+ * anything of `half`. `dst` may be `src`; `tmp` and `half` are images of their own.
+ *
+ * Other types than U8G return before the type of `tmp` is looked at, and nothing is written. Stops the process on
+ *  - "src->data != __null && dst->data != __null && tmp->data != __null"
+ *  - "dst->type == src->type && src->width == dst->width && dst->height == src->height"
+ *  - "tmp->type == KEL_PIXEL_TYPE_S16G"
+ *
+ * always from applyKelFilterGaussian5X5_downsampling(), which does the work; applyKelFilterGaussian5X5() passes no `half`.
+ * @{
+ */
 KEL_API void applyKelFilterGaussian5X5_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
 KEL_API void applyKelFilterGaussian5X5(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
+/** @} */
 
-/** Smoothing with (2, 7, 14, 18, 14, 7, 2) / 64 both ways, optionally with every second sample into `half` (may be null). */
+/**
+ * @name Gaussian 7x7
+ * Smoothing of a U8G image with w = (2, 7, 14, 18, 14, 7, 2) / 64 in both directions, rounded after each:
+ *
+ *     tmp(x, y) = (sum w[i] * src(x + i - 3, y) + 32) >> 6
+ *     dst(x, y) = (sum w[i] * tmp(x, y + i - 3) + 32) >> 6
+ *
+ * Unlike 5x5 it clears no border: what is not listed here keeps its contents.
+ *  - `tmp` has the extent of the first pass, whatever `dst` measures, and gets it even where `dst` is too low for the
+ *    second. Wider than 16, it is written from column 8 in blocks of 8 while there are more than 8 columns left, followed
+ *    by EIGHT ZEROS: columns 8 .. T-9 and zeros in T-8 .. T-1 where T is tmp->width rounded up to a multiple of 8.
+ *  - `dst`, wider than 16, is written in rows 3 .. H-4 from column 8 in blocks of 16: columns 8 .. S-9, where S is its step;
+ *    the last may lie in the padding. In a width whose remainder by 16 is 1 to 8 the last block reads the zeros in `tmp`:
+ *    of a constant image 56 wide, columns 48 .. 55 come out as 0.
+ *  - `half`, unless it is null, takes half(x/2, y/2) = dst(x, y) for the even x and y written above: rows 2 .. (H-4)/2,
+ *    columns 4 .. S/2-5, followed by EIGHT ZEROS. Where `half` is just ceil(W/2) wide, four of these may lie in the next
+ *    row, columns 0 .. 3.
+ *
+ * `tmp` is U8G and at least as wide and high as `src`; if it is larger, `src` needs memory to be read at the same
+ * places. Neither its size nor anything of `half` is checked. In a width whose remainder by 8 is 1 or 2 the last columns
+ * take in up to two pixels of the source's padding. `dst` may be `src`; `tmp` and `half` are images of their own.
+ *
+ * Other types than U8G return before the type of `tmp` is looked at, and nothing is written. Stops the process on
+ *  - "src->data != __null && dst->data != __null && tmp->data != __null"
+ *  - "dst->type == src->type && src->width == dst->width && dst->height == src->height"
+ *  - "tmp->type == KEL_PIXEL_TYPE_U8G"
+ *
+ * always from applyKelFilterGaussianSSE7X7_downsampling(), which does the work; the names without _downsampling pass no
+ * `half`.
+ * @{
+ */
 KEL_API void applyKelFilterGaussianSSE7X7_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
 KEL_API void applyKelFilterGaussianSSE7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
 KEL_API void applyKelFilterGaussian7X7_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
 KEL_API void applyKelFilterGaussian7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
+/** @} */
 
-/** Cross operator at distance 5. */
+/**
+ * @name Cross operator
+ * A Laplacian-like response of a U8G image in an S16G one of the same size. Its neighbours are FIVE pixels away, as the
+ * keypoint detector wants them, although the name says 3X3:
+ *
+ *     dst(x, y) = src(x-5, y) + src(x+5, y) + src(x, y-5) + src(x, y+5) - 4 * src(x, y)        -1020..1020
+ *
+ * Written are rows 5 .. H-6, columns 8 .. S-9, where S is the step: the last may lie in the padding. Columns from W-5 on take
+ * in the source's padding. Everything else keeps its contents. Nothing is written where H < 11 or W <= 16.
+ *
+ * Another source type returns before the destination's is looked at. Stops the process, always from
+ * applyKelFilterLaplacianSSE3X3(), on "dst->step == src->step && dst->width == src->width && dst->height == src->height" and
+ * "dst->type == KEL_PIXEL_TYPE_S16G".
+ * @{
+ */
 KEL_API void applyKelFilterLaplacianSSE3X3(kelImage_t* dst, kelImage_t* src);
 KEL_API void applyKelFilterLaplacian3X3(kelImage_t* dst, kelImage_t* src);
+/** @} */
 
-/** Sobel gradient magnitude. */
+/**
+ * @name Sobel magnitude
+ * Gradient magnitude (I. Sobel and G. Feldman, 1968) of a U8G image in an S16G one of the same size:
+ *
+ *     gx = (left column, weights 1 2 1) - (right column),   gy = (row above, weights 1 2 1) - (row below)
+ *     dst(x, y) = round(sqrt(gx^2 + gy^2))                                                      0..1442
+ *
+ * The root in single precision and the conversion to integers follow the thread's rounding mode: by default to nearest,
+ * ties to even.
+ *
+ * Written are rows 1 .. H-2 and, where W > 32, columns 16 .. R-17 followed by FOUR ZEROS in R-16 .. R-13, R being W rounded
+ * up to a multiple of 4; everything else keeps its contents. Nothing is written where H < 3 or W <= 32.
+ *
+ * Another source type returns before the destination's is looked at. Stops the process, always from
+ * applyKelFilterSobelSSE3X3(), on "dst->step == src->step && dst->width == src->width && dst->height == src->height" and
+ * "dst->type == KEL_PIXEL_TYPE_S16G".
+ * @{
+ */
 KEL_API void applyKelFilterSobelSSE3X3(kelImage_t* dst, kelImage_t* src);
 KEL_API void applyKelFilterSobel3X3(kelImage_t* dst, kelImage_t* src);
+/** @} */
 
-/** Rank filter over a (2n+1) x (2n+1) window. */
+/**
+ * Rank filter over the (2n+1) x (2n+1) window of a U8G image: the value of rank 2n(n+1) + 1, counted from 0 in ascending
+ * order. That is ONE ABOVE the median: of the nine values of n = 1, the sixth smallest.
+ *
+ * Every pixel of `dst` is written, with 0 where the window does not fit into the image (a border n wide); padding is not.
+ * `dst` must not be `src`. One call of qsort() a pixel: this is simple, not fast. A radius below 1 is not supported and
+ * writes nothing. Another source type writes nothing; the destination's type is not looked at.
+ * Stops the process on "dst->step == src->step && dst->width == src->width && dst->height == src->height".
+ */
 KEL_API void applyKelFilterMedianNXN(kelImage_t* dst, kelImage_t* src, kelValue_s32 n);
 
 /** Inert: returns at once. Use applyKelFilterMedianNXN() with n = 1. */
 KEL_API void applyKelFilterMedian3X3(kelImage_t* dst, kelImage_t* src);
 
-/** Uniform integer noise in -amplitude .. amplitude. */
+/**
+ * Adds uniform integer noise to a U8G image: dst = clamp(src - amplitude + rand() % (2 * amplitude + 1), 0, 255).
+ *
+ * Draws rand() once for every pixel, row by row from left to right, and never for padding: srand() before makes a result
+ * repeatable within one thread. Amplitude 0 copies the pixels and draws nothing. `dst` may be `src`. Padding is not written.
+ * Other types write and draw nothing. Stops the process on "dst->type == src->type" and
+ * "dst->step == src->step && dst->width == src->width && dst->height == src->height".
+ */
 KEL_API void applyKelFilterNoise(kelImage_t* dst, kelImage_t* src, kelValue_s32 amplitude);
 
 /* ------------------------------------------------------------------------------------------------------------------
@@ -363,7 +464,30 @@ typedef struct kelKeypoint2DF32_t_ {
     kelValue_s32 tag;   /**< -1 as written by the detector; free for the caller. */
 } kelKeypoint2DF32_t;
 
-/** YAPE keypoints of a smoothed U8G image and its cross response. */
+/**
+ * YAPE keypoints: strong, not edge-like local extrema of the cross response L (S16G, applyKelFilterLaplacian3X3()) of a
+ * smoothed image G (U8G, applyKelFilterGaussian7X7()), refined to a fraction of a pixel. Point detection on circles after
+ * V. Lepetit and P. Fua, "Keypoint recognition using randomized trees", 2006; refinement after M. Brown and D. Lowe,
+ * "Invariant features from interest point groups", 2002.
+ *
+ * Writes the first `max` points, row by row from left to right, to `keypoints` and returns how many there are. Both images
+ * are only read. A pixel is a point where
+ *  - it is at least 9 pixels from every edge, and the scan comes upon it: in each row it starts at column 9, and after a
+ *    column with |L| <= 19 it STEPS OVER THE NEXT ONE. In a flat row columns 9, 11, 13, ... are examined, and a lone
+ *    extremum in an even column is missed;
+ *  - |L| >= 31, and L is strictly greater (positive L) or strictly less (negative L) than its eight neighbours;
+ *  - score = min(|L - e|, |L + e|) >= 26, where e = trunc(sqrt(b^2 + 4 a^2)),
+ *    a = G(x+3, y+3) + G(x-3, y-3) - G(x-3, y+3) - G(x+3, y-3) and b = G(x+5, y) + G(x-5, y) - G(x, y-5) - G(x, y+5):
+ *    on a straight edge e is as large as |L|.
+ *
+ * The refinement takes at most five Newton steps to the extremum of the quadratic through 3x3 responses, in single
+ * precision, and moves to another pixel, by the truncated step, while a step reaches half a pixel. The LAST STEP IS ADDED TO
+ * THE PIXEL ITSELF, not to where the refinement had moved. Where it moves to x <= 9, y <= 9, x >= W-9 or y >= H-9, or the
+ * result lies there, the point stays on its pixel.
+ *
+ * The type of `laplacian` is not checked: it is read as S16G. Another type of `gaussian` returns 0.
+ * Stops the process on "gaussian->width == laplacian->width && gaussian->height == laplacian->height".
+ */
 KEL_API kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoints, kelValue_s32 max, kelImage_t* gaussian,
                                                   kelImage_t* laplacian);
 

@@ -1,0 +1,47 @@
+// Pictures between files and images: PNG, JPEG, binary PGM and PPM in; PNG out. Every failure is an Error whose text names the file.
+#ifndef KEL_EXAMPLES_PICTURE_H
+#define KEL_EXAMPLES_PICTURE_H
+
+#include <cstdint>
+#include <kel/kelImage.h>
+#include <memory>
+#include <stdexcept>
+#include <string>
+
+namespace kel_examples {
+
+// Bad input or output: what was wrong with which file.
+struct Error : std::runtime_error {
+    using std::runtime_error::runtime_error;
+};
+
+struct Release {
+    void operator()(kelImage_t* image) const { releaseKelImage(&image); }
+};
+using Image = std::unique_ptr<kelImage_t, Release>;
+
+inline Image create(int width, int height, int type) {
+    return Image(createKelImage(width, height, type));
+}
+inline Image clone(const Image& image) {
+    return Image(cloneKelImage(image.get()));
+}
+
+// Decodes a picture in memory to RGB (U8ZYX). `name` stands in the errors.
+Image decodePicture(const uint8_t* bytes, size_t size, const std::string& name);
+
+// Reads a picture file to RGB (U8ZYX). At least 2 pixels and at most 16384 either way.
+Image readPicture(const std::string& path);
+
+// Writes U8ZYX or U8G as PNG, first beside its place and then into it, so that nothing half-written is left behind.
+void writePicture(const std::string& path, const Image& image);
+
+// Makes a folder, and those above it.
+void makeFolder(const std::string& path);
+
+// The picture's grey values (the mean of its channels), padding filled with each row's last pixel.
+Image greyOf(const Image& picture);
+
+} // namespace kel_examples
+
+#endif

@@ -1,0 +1,72 @@
+// Vector building blocks that the portable and the vector converters share: grey spread over channels, and the products of YUV
+// to colour, up to where the two forms part. Rests on SSE4.1 alone.
+#ifndef KEL_IMAGE_CONVERTER_LANES_H
+#define KEL_IMAGE_CONVERTER_LANES_H
+
+#include <smmintrin.h>
+#include <stdint.h>
+
+namespace kel {
+
+inline __m128i load16(const uint8_t* src) {
+    return _mm_loadu_si128(reinterpret_cast<const __m128i*>(src));
+}
+inline __m128i load8(const uint8_t* src) {
+    return _mm_loadl_epi64(reinterpret_cast<const __m128i*>(src));
+}
+inline void store16(uint8_t* dst, __m128i value) {
+    _mm_storeu_si128(reinterpret_cast<__m128i*>(dst), value);
+}
+inline void store8(uint8_t* dst, __m128i value) {
+    _mm_storel_epi64(reinterpret_cast<__m128i*>(dst), value);
+}
+
+// Writes 16 grey values as 16 pixels of N channels, the fourth being 0. Index -1 of a shuffle gives 0.
+template <int N> inline void storeGrey(uint8_t* dst, __m128i grey) {
+    static_assert(N == 1 || N == 3 || N == 4, "");
+    if (N == 1) {
+        store16(dst, grey);
+    } else if (N == 3) {
+        store16(dst, _mm_shuffle_epi8(grey, _mm_setr_epi8(0, 0, 0, 1, 1, 1, 2, 2, 2, 3, 3, 3, 4, 4, 4, 5)));
+        store16(dst + 16, _mm_shuffle_epi8(grey, _mm_setr_epi8(5, 5, 6, 6, 6, 7, 7, 7, 8, 8, 8, 9, 9, 9, 10, 10)));
+        store16(dst + 32,
+                _mm_shuffle_epi8(grey, _mm_setr_epi8(10, 11, 11, 11, 12, 12, 12, 13, 13, 13, 14, 14, 14, 15, 15, 15)));
+    } else {
+        store16(dst, _mm_shuffle_epi8(grey, _mm_setr_epi8(0, 0, 0, -1, 1, 1, 1, -1, 2, 2, 2, -1, 3, 3, 3, -1)));
+        store16(dst + 16, _mm_shuffle_epi8(grey, _mm_setr_epi8(4, 4, 4, -1, 5, 5, 5, -1, 6, 6, 6, -1, 7, 7, 7, -1)));
+        store16(dst + 32, _mm_shuffle_epi8(grey, _mm_setr_epi8(8, 8, 8, -1, 9, 9, 9, -1, 10, 10, 10, -1, 11, 11, 11, -1)));
+        store16(dst + 48,
+                _mm_shuffle_epi8(grey, _mm_setr_epi8(12, 12, 12, -1, 13, 13, 13, -1, 14, 14, 14, -1, 15, 15, 15, -1)));
+    }
+}
+
+// YUV to colour, with U' = U - 128 and V' = V - 128:
+//   C = (Y - 16) * kLuma, R = C + kRedV * V', G = C + kGreenU * U' + kGreenV * V', B = C + kBlueU * U',
+// each product rounded to single precision. The portable and the vector form differ in how they sum up G and in how they round.
+constexpr float kLuma = 1.164f, kRedV = 1.793f, kGreenU = -0.213f, kGreenV = -0.534f, kBlueU = 2.115f;
+
+// The products of four pairs of pixels, one pair in a lane. C[0] belongs to the first pixels of the pairs, C[1] to the second.
+struct YuvProducts {
+    __m128 C[2], redV, greenU, greenV, blueU;
+};
+
+// `pairs` holds U, Y0, V, Y1 four times.
+inline YuvProducts yuvProducts(__m128i pairs) {
+    const __m128i lowWord = _mm_set1_epi32(1); // pmaddwd with it leaves the lower word of each lane, with its sign
+    const __m128i y = _mm_sub_epi16(_mm_srli_epi16(pairs, 8), _mm_set1_epi16(16));
+    const __m128i uv = _mm_sub_epi16(_mm_and_si128(pairs, _mm_set1_epi16(0xff)), _mm_set1_epi16(128));
+    const __m128 u = _mm_cvtepi32_ps(_mm_madd_epi16(uv, lowWord));
+    const __m128 v = _mm_cvtepi32_ps(_mm_srai_epi32(uv, 16));
+    YuvProducts p;
+    p.C[0] = _mm_mul_ps(_mm_cvtepi32_ps(_mm_madd_epi16(y, lowWord)), _mm_set1_ps(kLuma));
+    p.C[1] = _mm_mul_ps(_mm_cvtepi32_ps(_mm_srai_epi32(y, 16)), _mm_set1_ps(kLuma));
+    p.redV = _mm_mul_ps(v, _mm_set1_ps(kRedV));
+    p.greenU = _mm_mul_ps(u, _mm_set1_ps(kGreenU));
+    p.greenV = _mm_mul_ps(v, _mm_set1_ps(kGreenV));
+    p.blueU = _mm_mul_ps(u, _mm_set1_ps(kBlueU));
+    return p;
+}
+
+} // namespace kel
+
+#endif

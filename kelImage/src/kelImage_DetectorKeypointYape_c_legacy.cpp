@@ -1,0 +1,176 @@
+// YAPE keypoints: local extrema of the cross response that are strong, not edge-like, and refined to a fraction of a pixel.
+// Rests on the row helpers; a vector test finds the few columns of a row that can be extrema at all.
+#include <algorithm>
+#include <cmath>
+#include <cstdlib>
+
+#include "kelImage_Private.h"
+#include "kelImage_Vector.h"
+
+namespace {
+
+using kel::load16;
+
+constexpr kelValue_s32 kBorder = 9; // pixels nearer to an edge are never examined
+constexpr int kWeak = 19;           // up to here the scan steps over the next column
+constexpr int kStrong = 31;         // from here an extremum counts
+constexpr int kLeastScore = 26;
+constexpr int kRounds = 5;          // of the refinement
+constexpr kelValue_s32 kBlock = 16; // columns that are tested at a time
+
+struct Offset {
+    float x, y;
+};
+
+// Eight columns: all bits where the response is strong and beyond its left, right, upper and lower neighbour.
+inline __m128i eightCandidates(const int16_t* r, ptrdiff_t step) {
+    const __m128i left = load16(r - 1), right = load16(r + 1), up = load16(r - step), down = load16(r + step);
+    const __m128i most = _mm_max_epi16(_mm_max_epi16(left, right), _mm_max_epi16(up, down));
+    const __m128i least = _mm_min_epi16(_mm_min_epi16(left, right), _mm_min_epi16(up, down));
+    const __m128i here = load16(r);
+    return _mm_or_si128(_mm_cmpgt_epi16(here, _mm_max_epi16(most, _mm_set1_epi16(kStrong - 1))),
+                        _mm_cmplt_epi16(here, _mm_min_epi16(least, _mm_set1_epi16(1 - kStrong))));
+}
+
+// Bit i stands for column i. Reads columns -1 .. 16 of three rows.
+inline unsigned candidates(const int16_t* r, ptrdiff_t step) {
+    const __m128i mask = _mm_packs_epi16(eightCandidates(r, step), eightCandidates(r + 8, step));
+    return static_cast<unsigned>(_mm_movemask_epi8(mask));
+}
+
+// A candidate is beyond its four direct neighbours already; an extremum is beyond the diagonal ones, too.
+bool isExtremum(const int16_t* r, ptrdiff_t step) {
+    const int here = *r, a = r[-step - 1], b = r[-step + 1], c = r[step - 1], d = r[step + 1];
+    const bool peak = here > std::max({a, b, c, d}), pit = here < std::min({a, b, c, d});
+    return (peak & (here > 0)) | (pit & (here < 0));
+}
+
+// The scan starts at kBorder, and after a weak column it steps over the next one: an extremum there is missed, and callers
+// rely on it. So a strong column is examined exactly where an even number of weak ones stands right before it.
+bool isExamined(const int16_t* row, kelValue_s32 x) {
+    kelValue_s32 first = x;
+    while (first > kBorder && std::abs(row[first - 1]) <= kWeak)
+        --first;
+    return (x - first) % 2 == 0;
+}
+
+// The response plays the trace of a curvature matrix, `edge` the difference of its eigenvalues: what is left is the weaker one.
+int score(const uint8_t* g, ptrdiff_t step, int response) {
+    const int a = g[3 * step + 3] + g[-3 * step - 3] - g[3 * step - 3] - g[-3 * step + 3];
+    const int b = g[5] + g[-5] - g[-5 * step] - g[5 * step];
+    const int edge = static_cast<int>(std::sqrt(static_cast<double>(b * b + 4 * a * a)));
+    return std::min(std::abs(response - edge), std::abs(response + edge));
+}
+
+// One Newton step to the extremum of the quadratic through the 3x3 responses around r, in single precision.
+Offset newtonStep(const int16_t* r, ptrdiff_t step) {
+    const float dx = static_cast<float>(r[1] - r[-1]) * 0.5f;
+    const float dy = static_cast<float>(r[step] - r[-step]) * 0.5f;
+    const float dxx = static_cast<float>(r[-1] + r[1] - 2 * r[0]);
+    const float dyy = static_cast<float>(r[-step] + r[step] - 2 * r[0]);
+    const float dxy = static_cast<float>(r[step + 1] - r[step - 1] - r[-step + 1] + r[-step - 1]) * 0.25f;
+    const float determinant = dxx * dyy - dxy * dxy;
+    const float k = determinant != 0 ? -1 / determinant : -0.0f;
+    return {(dyy * dx - dxy * dy) * k, (dxx * dy - dxy * dx) * k};
+}
+
+// Truncates; beyond 32 bits the result is the least integer, which lies outside every image.
+inline int64_t truncated(float value) {
+    return _mm_cvttss_si32(_mm_set_ss(value));
+}
+
+bool isInside(int64_t x, int64_t y, const kelImage_t* image) {
+    return x > kBorder && y > kBorder && x < image->width - kBorder && y < image->height - kBorder;
+}
+
+Offset refine(const kelImage_t* laplacian, kelValue_s32 x, kelValue_s32 y) {
+    Offset offset{0, 0};
+    int64_t px = x, py = y;
+    for (int round = 0; round < kRounds; ++round) {
+        offset = newtonStep(kel::row<int16_t>(laplacian, static_cast<kelValue_s32>(py)) + px, laplacian->step);
+        if (std::abs(offset.x) < 0.5f && std::abs(offset.y) < 0.5f)
+            break;
+        px += truncated(offset.x);
+        py += truncated(offset.y);
+        if (!isInside(px, py, laplacian))
+            return {0, 0};
+    }
+    return offset;
+}
+
+// The last step goes onto the pixel itself, not onto where the refinement had moved: callers rely on it.
+kelKeypoint2DF32_t keypointAt(const kelImage_t* laplacian, kelValue_s32 x, kelValue_s32 y, int score) {
+    const Offset offset = refine(laplacian, x, y);
+    const float fx = static_cast<float>(x), fy = static_cast<float>(y), least = static_cast<float>(kBorder);
+    const float fine[] = {fx + offset.x, fy + offset.y};
+    if (fine[0] <= least || fine[0] >= static_cast<float>(laplacian->width - kBorder) || fine[1] <= least ||
+        fine[1] >= static_cast<float>(laplacian->height - kBorder))
+        return {fx, fy, score, -1};
+    return {fine[0], fine[1], score, -1};
+}
+
+// The scan of one pair of images: what it reads, where its records go, and the candidates of a row that are still to be judged.
+class Scan {
+public:
+    Scan(const kelImage_t* gaussian, const kelImage_t* laplacian, kelKeypoint2DF32_t* keypoints, kelValue_s32 max)
+        : m_gaussian(gaussian), m_laplacian(laplacian), m_keypoints(keypoints), m_max(max) {}
+
+    // Blocks start on a multiple of 8; those at the end of a row read on into the rows below, of which there are enough.
+    void row(kelValue_s32 y) {
+        const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
+        const kelValue_s32 end = m_laplacian->width - kBorder;
+        for (kelValue_s32 block = kBorder - 1; block < end; block += kBlock) {
+            unsigned mask = candidates(response + block, m_laplacian->step);
+            for (; mask != 0; mask &= mask - 1) {
+                const kelValue_s32 x = block + __builtin_ctz(mask);
+                m_columns[m_pending] = x;
+                m_pending += x >= kBorder && x < end;
+            }
+            if (m_pending > kCapacity - kBlock)
+                judge(y);
+        }
+        judge(y);
+    }
+    kelValue_s32 count() const { return m_count; }
+
+private:
+    // Most candidates fail and none can be predicted, so the failing ones are overwritten instead of branched around.
+    __attribute__((noinline)) void judge(kelValue_s32 y) {
+        const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
+        const uint8_t* const grey = kel::row<uint8_t>(m_gaussian, y);
+        int kept = 0, strengths[kCapacity];
+        for (int i = 0; i < m_pending; ++i) {
+            const kelValue_s32 x = m_columns[i];
+            const int strength = score(grey + x, m_gaussian->step, response[x]);
+            m_columns[kept] = x;
+            strengths[kept] = strength;
+            kept += (strength >= kLeastScore) & isExtremum(response + x, m_laplacian->step);
+        }
+        m_pending = 0;
+        for (int i = 0; i < kept; ++i)
+            if (isExamined(response, m_columns[i]) && m_count < m_max)
+                m_keypoints[m_count++] = keypointAt(m_laplacian, m_columns[i], y, strengths[i]);
+    }
+
+    static constexpr int kCapacity = 128;
+    const kelImage_t* const m_gaussian;
+    const kelImage_t* const m_laplacian;
+    kelKeypoint2DF32_t* const m_keypoints;
+    const kelValue_s32 m_max;
+    kelValue_s32 m_count = 0;
+    int m_pending = 0;
+    kelValue_s32 m_columns[kCapacity];
+};
+
+} // namespace
+
+extern "C" kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoints, kelValue_s32 max, kelImage_t* gaussian,
+                                                     kelImage_t* laplacian) {
+    KEL_ASSERT(gaussian->width == laplacian->width && gaussian->height == laplacian->height);
+    if (gaussian->type != KEL_PIXEL_TYPE_U8G)
+        return 0;
+    Scan scan(gaussian, laplacian, keypoints, max);
+    for (kelValue_s32 y = kBorder; y < gaussian->height - kBorder; ++y)
+        scan.row(y);
+    return scan.count();
+}

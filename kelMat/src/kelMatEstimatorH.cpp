@@ -1,0 +1,218 @@
+// Homographies from pairs of 2-D points: four-point solution, least squares, Taubin's method, RANSAC.
+#include <cstdlib>
+
+#include "kelMatEstimator_Private.h"
+
+namespace {
+
+constexpr int kLeastPairs = 5; // of the over-determined fits
+constexpr int kUnknowns = 9;   // h00 h01 h02 h10 ... h22
+
+// Two design rows of a pair, theta times each of which a right homography makes zero:
+// | 0   0   0  -x1 -y1 -1   y2 x1   y2 y1   y2 |
+// | x1  y1  1   0   0   0  -x2 x1  -x2 y1  -x2 |
+void fillRows(float* row, float x1, float y1, float x2, float y2) {
+    const float rows[2 * kUnknowns] = {0,  0,  0, -x1, -y1, -1, y2 * x1,  y2 * y1,  y2, //
+                                       x1, y1, 1, 0,   0,   0,  -x2 * x1, -x2 * y1, -x2};
+    std::copy_n(rows, 2 * kUnknowns, row);
+}
+
+// The least-squares solution of design rows, scaled so that H[2][2] is 1.
+void solve(kelMat& H, kelMat& A) {
+    kel::smallestSingularVector<kUnknowns>(A, H.m_Data);
+    H.setDataUnitize();
+}
+
+// G is the unit square's homography with a last element of 1; the result is the adjugate over the determinant.
+void invertUnitSquareProjection(const float* g, float* inverse) {
+    const float determinant =
+        g[0] * g[4] - g[7] * (g[5] * g[0]) - g[3] * g[1] + g[7] * (g[3] * g[2]) + g[5] * (g[1] * g[6]) - g[4] * (g[2] * g[6]);
+    const float r = 1.0f / determinant;
+    const float adjugate[9] = {g[4] - g[5] * g[7],        g[2] * g[7] - g[1],        g[1] * g[5] - g[2] * g[4],
+                               g[5] * g[6] - g[3],        g[0] - g[2] * g[6],        g[2] * g[3] - g[0] * g[5],
+                               g[3] * g[7] - g[4] * g[6], g[1] * g[6] - g[0] * g[7], g[0] * g[4] - g[1] * g[3]};
+    for (int i = 0; i < 9; ++i)
+        inverse[i] = adjugate[i] * r;
+}
+
+// countInliers() for a homography.
+int countTransfers(const kelMat& H, const kelMatCorrespH& corresp, float threshold, int best, uint8_t* marks) {
+    const int n = corresp.m_Num;
+    const float* const h = H.m_Data;
+    const auto times = [h](int r, __m128 x, __m128 y) {
+        const __m128 xy = _mm_add_ps(_mm_mul_ps(x, _mm_set1_ps(h[3 * r])), _mm_mul_ps(y, _mm_set1_ps(h[3 * r + 1])));
+        return _mm_add_ps(xy, _mm_set1_ps(h[3 * r + 2]));
+    };
+    return kel::countInliers(n, threshold, best, marks, [&](int i) {
+        const __m128 x = kel::fourValues(corresp.m_SrcX, i, n), y = kel::fourValues(corresp.m_SrcY, i, n);
+        return kel::squaredDistances(times(0, x, y), times(1, x, y), times(2, x, y), kel::fourValues(corresp.m_DstX, i, n),
+                                     kel::fourValues(corresp.m_DstY, i, n));
+    });
+}
+
+} // namespace
+
+kelMatEstimatorH::kelMatEstimatorH() : kelMat(3, 3, true) {}
+
+kelMatEstimatorH::~kelMatEstimatorH() {}
+
+bool kelMatEstimatorH::estimate_by4P(float x1_0, float y1_0, float x2_0, float y2_0, float x1_1, float y1_1, float x2_1,
+                                     float y2_1, float x1_2, float y1_2, float x2_2, float y2_2, float x1_3, float y1_3,
+                                     float x2_3, float y2_3) {
+    float G1[9], G2[9], inverse[9];
+    UnitSquareProjection(x1_0, y1_0, x1_1, y1_1, x1_2, y1_2, x1_3, y1_3, G1);
+    UnitSquareProjection(x2_0, y2_0, x2_1, y2_1, x2_2, y2_2, x2_3, y2_3, G2);
+    G2[8] = 1.0f;
+    invertUnitSquareProjection(G1, inverse);
+    kel::multiply(m_Data, G2, inverse, 3, 3, 3);
+    return true;
+}
+
+bool kelMatEstimatorH::estimate_byLSM(kelMatCorrespH& corresp) {
+    const int n = corresp.m_Num;
+    if (n < kLeastPairs)
+        return false;
+    kelMat A(2 * n, kUnknowns, false);
+    for (int i = 0; i < n; ++i)
+        fillRows(A[2 * i], corresp.m_SrcX[i], corresp.m_SrcY[i], corresp.m_DstX[i], corresp.m_DstY[i]);
+    solve(*this, A);
+    return true;
+}
+
+bool kelMatEstimatorH::estimate_byLSM_fine(kelMatCorrespH& corresp) {
+    if (corresp.m_Num < kLeastPairs)
+        return false;
+    kelMatCorrespH normalized;
+    kelMat T1, T2;
+    corresp.normalize(normalized, T1, T2);
+    estimate_byLSM(normalized);
+    kel::denormalize<3>(*this, T2, T1);
+    return true;
+}
+
+bool kelMatEstimatorH::estimate_byTaubin(kelMatCorrespH& corresp) {
+    const int n = corresp.m_Num;
+    if (n < kLeastPairs)
+        return false;
+    kel::Moments<kUnknowns> ofRows, ofDerivatives;
+    for (int i = 0; i < n; ++i) {
+        const float x1 = corresp.m_SrcX[i], y1 = corresp.m_SrcY[i], x2 = corresp.m_DstX[i], y2 = corresp.m_DstY[i];
+        float rows[2][kUnknowns];
+        fillRows(rows[0], x1, y1, x2, y2);
+        ofRows.addRow(rows[0]);
+        ofRows.addRow(rows[1]);
+        // By x1, y1 and y2 of the first row (by x2 it is zero), by x1, y1 and x2 of the second.
+        ofDerivatives.addRow({0, 0, 0, -1, 0, 0, y2, 0, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, -1, 0, 0, y2, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, 0, 0, x1, y1, 1});
+        ofDerivatives.addRow({1, 0, 0, 0, 0, 0, -x2, 0, 0});
+        ofDerivatives.addRow({0, 1, 0, 0, 0, 0, 0, -x2, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, 0, 0, -x1, -y1, -1});
+    }
+    kelMat M, N, lambda, X;
+    ofRows.get(M, 1.0f);
+    ofDerivatives.get(N, 1.0f);
+    N.getGeneralizedEigenValue(M, lambda, X);
+    int k = 0;
+    for (int i = 1; i < lambda.m_Height; ++i)
+        if (lambda[i][0] > lambda[k][0])
+            k = i;
+    kel::eigenvectorOrNaN<kUnknowns>(X, k, m_Data);
+    setDataUnitize();
+    return true;
+}
+
+bool kelMatEstimatorH::estimate_byRANSAC_fine(kelMatCorrespH& corresp, float threshold, int* inliers) {
+    constexpr int kSample = 4, kMostDraws = 1500, kManyDraws = 1600, kEnoughInliers = 50;
+    const int n = corresp.m_Num;
+    if (n < kSample)
+        return false;
+    kelMatCorrespH normalized;
+    kelMat T1, T2;
+    corresp.normalize(normalized, T1, T2);
+    const std::vector<float>&x1 = normalized.m_SrcX, &y1 = normalized.m_SrcY, &x2 = normalized.m_DstX, &y2 = normalized.m_DstY;
+
+    kel::Marks current(n), chosen(n);
+    int best = 0, draws = kMostDraws, draw = 0;
+    do {
+        int a, b, c, d;
+        getRandomIndex(a, b, c, d, n);
+        estimate_by4P(x1[a], y1[a], x2[a], y2[a], x1[b], y1[b], x2[b], y2[b], x1[c], y1[c], x2[c], y2[c], x1[d], y1[d], x2[d],
+                      y2[d]);
+        kel::denormalize<3>(*this, T2, T1);
+        if (judgeHomography(*this)) {
+            const int count = countTransfers(*this, corresp, threshold, best, current.bytes());
+            if (count > best) {
+                const double needed = kel::drawsNeeded(count, n);
+                draws = std::min(draws, needed > kMostDraws ? kManyDraws : kel::truncated(needed + 0.5));
+                std::swap(current, chosen);
+                best = count;
+            }
+        }
+    } while (best < kEnoughInliers && ++draw < draws);
+
+    for (;;) {
+        if (best < kLeastPairs)
+            return false;
+        kelMat A(2 * best, kUnknowns, false);
+        float* row = A.m_Data;
+        for (int i = 0; i < n; ++i)
+            if (chosen[i]) {
+                fillRows(row, x1[i], y1[i], x2[i], y2[i]);
+                row += 2 * kUnknowns;
+            }
+        solve(*this, A);
+        kel::denormalize<3>(*this, T2, T1);
+        if (!judgeHomography(*this))
+            return false;
+        const int count = countTransfers(*this, corresp, threshold, kel::kCountAll, chosen.bytes());
+        if (count <= best) {
+            if (inliers)
+                *inliers = count;
+            return true;
+        }
+        best = count;
+    }
+}
+
+void getRandomIndex(int& a, int& b, int& c, int& d, int n) {
+    a = rand() % n;
+    do
+        b = rand() % n;
+    while (b == a);
+    do // c is compared with b alone and may equal a; callers rely on the draws
+        c = rand() % n;
+    while (c == b);
+    do
+        d = rand() % n;
+    while (d == c || d == b || d == a);
+}
+
+// Every test is written so that NaN passes it. The scale bounds are compared in single precision, the others in double.
+bool judgeHomography(kelMat& H) {
+    constexpr float kLargestScale = 4.0f;
+    constexpr double kSmallestScale = 0.1, kLargestPerspective = 0.002;
+    if (H[0][0] * H[1][1] - H[1][0] * H[0][1] < 0.0f)
+        return false;
+    for (int c = 0; c < 2; ++c) {
+        const float scale = std::sqrt(H[0][c] * H[0][c] + H[1][c] * H[1][c]);
+        if (scale > kLargestScale || static_cast<double>(scale) < kSmallestScale)
+            return false;
+    }
+    const float perspective = std::sqrt(H[2][0] * H[2][0] + H[2][1] * H[2][1]);
+    return !(static_cast<double>(perspective) > kLargestPerspective);
+}
+
+int judgeInliers(kelMat& H, kelMatCorrespH& corresp, std::vector<bool>& mask, float threshold) {
+    const int n = corresp.m_Num;
+    if (n < 1)
+        return 0;
+    if (H.m_Width != 3 || H.m_Height != 3) {
+        float x, y;
+        H.cvtPoint(0.0f, 0.0f, &x, &y); // stops the process on the size
+    }
+    kel::Marks marks(n);
+    const int count = countTransfers(H, corresp, threshold, kel::kCountAll, marks.bytes());
+    kel::copyMarks(mask, marks, n);
+    return count;
+}

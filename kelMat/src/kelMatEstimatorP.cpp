@@ -1,0 +1,218 @@
+// Camera projections from pairs of a 3-D and a 2-D point: least squares, Taubin's method, RANSAC.
+#include <cstdio>
+#include <cstdlib>
+
+#include "kelMatEstimator_Private.h"
+
+namespace {
+
+constexpr int kLeastPairs = 6;
+constexpr int kUnknowns = 12; // p00 p01 p02 p03 p10 ... p23
+
+// Two design rows of a pair, theta times each of which a right projection makes zero:
+// | X  Y  Z  1  0  0  0  0  -x X  -x Y  -x Z  -x |
+// | 0  0  0  0  X  Y  Z  1  -y X  -y Y  -y Z  -y |
+void fillRows(float* row, float X, float Y, float Z, float x, float y) {
+    const float rows[2 * kUnknowns] = {X, Y, Z, 1, 0, 0, 0, 0, -x * X, -x * Y, -x * Z, -x, //
+                                       0, 0, 0, 0, X, Y, Z, 1, -y * X, -y * Y, -y * Z, -y};
+    std::copy_n(rows, 2 * kUnknowns, row);
+}
+
+void fillRows(float* row, const kelMatCorrespP& corresp, int i) {
+    fillRows(row, corresp.m_ObjX[i], corresp.m_ObjY[i], corresp.m_ObjZ[i], corresp.m_ImgX[i], corresp.m_ImgY[i]);
+}
+
+// The least-squares solution of design rows, scaled so that P[2][3] is 1.
+void solve(kelMat& P, kelMat& A) {
+    kel::smallestSingularVector<kUnknowns>(A, P.m_Data);
+    P.setDataUnitize();
+}
+
+// countInliers() for a projection.
+int countProjections(const kelMat& P, const kelMatCorrespP& corresp, float threshold, int best, uint8_t* marks) {
+    const int n = corresp.m_Num;
+    const float* const p = P.m_Data;
+    const auto times = [p](int r, __m128 X, __m128 Y, __m128 Z) {
+        const __m128 xy = _mm_add_ps(_mm_mul_ps(X, _mm_set1_ps(p[4 * r])), _mm_mul_ps(Y, _mm_set1_ps(p[4 * r + 1])));
+        return _mm_add_ps(_mm_add_ps(xy, _mm_mul_ps(Z, _mm_set1_ps(p[4 * r + 2]))), _mm_set1_ps(p[4 * r + 3]));
+    };
+    return kel::countInliers(n, threshold, best, marks, [&](int i) {
+        const __m128 X = kel::fourValues(corresp.m_ObjX, i, n), Y = kel::fourValues(corresp.m_ObjY, i, n),
+                     Z = kel::fourValues(corresp.m_ObjZ, i, n);
+        return kel::squaredDistances(times(0, X, Y, Z), times(1, X, Y, Z), times(2, X, Y, Z),
+                                     kel::fourValues(corresp.m_ImgX, i, n), kel::fourValues(corresp.m_ImgY, i, n));
+    });
+}
+
+void printBlock(const char* title, kelMat& M) {
+    puts(title);
+    M.print(nullptr);
+}
+
+// The index of the eigenvector that Taubin's fit takes. Not the plain maximum, and callers rely on it: eigenvalue 0 counts as it
+// is, later ones as magnitudes truncated to an integer; one that no int holds is never chosen.
+int chooseEigenvalue(const kelMat& lambda) {
+    if (lambda.m_Height < 1)
+        return 0;
+    int chosen = 0;
+    float best = lambda[0][0];
+    for (int k = 1; k < lambda.m_Height; ++k) {
+        const int whole = kel::truncated(static_cast<double>(lambda[k][0]));
+        const float magnitude = static_cast<float>(std::abs(static_cast<double>(whole)));
+        if (whole != std::numeric_limits<int>::min() && magnitude > best) {
+            chosen = k;
+            best = magnitude;
+        }
+    }
+    return chosen;
+}
+
+} // namespace
+
+kelMatEstimatorP::kelMatEstimatorP() : kelMat(3, 4, true) {}
+
+kelMatEstimatorP::~kelMatEstimatorP() {}
+
+bool kelMatEstimatorP::estimate_byLSM(kelMatCorrespP& corresp) {
+    const int n = corresp.m_Num;
+    if (n < kLeastPairs)
+        return false;
+    kelMat A(2 * n, kUnknowns, false);
+    for (int i = 0; i < n; ++i)
+        fillRows(A[2 * i], corresp, i);
+    solve(*this, A);
+    return true;
+}
+
+bool kelMatEstimatorP::estimate_byLSM_fine(kelMatCorrespP& corresp) {
+    if (corresp.m_Num < kLeastPairs)
+        return false;
+    kelMatCorrespP normalized;
+    kelMat T1, T2;
+    corresp.normalize(normalized, T1, T2);
+    estimate_byLSM(normalized);
+    kel::denormalize<4>(*this, T2, T1);
+    return true;
+}
+
+bool kelMatEstimatorP::estimate_byTaubin(kelMatCorrespP& corresp) {
+    const int n = corresp.m_Num;
+    if (n < kLeastPairs)
+        return false;
+    kel::Moments<kUnknowns> ofRows, ofDerivatives;
+    for (int i = 0; i < n; ++i) {
+        const float X = corresp.m_ObjX[i], Y = corresp.m_ObjY[i], Z = corresp.m_ObjZ[i];
+        const float x = corresp.m_ImgX[i], y = corresp.m_ImgY[i];
+        // All three rows of the cross product of image point and projection.
+        ofRows.addRow({X, Y, Z, 1, 0, 0, 0, 0, -x * X, -x * Y, -x * Z, -x});
+        ofRows.addRow({0, 0, 0, 0, -X, -Y, -Z, -1, y * X, y * Y, y * Z, y});
+        ofRows.addRow({-y * X, -y * Y, -y * Z, -y, x * X, x * Y, x * Z, x, 0, 0, 0, 0});
+        // Their derivatives by X, Y, Z, x and y, without those that are zero; the second row's are taken of its negative.
+        ofDerivatives.addRow({1, 0, 0, 0, 0, 0, 0, 0, -x, 0, 0, 0});
+        ofDerivatives.addRow({0, 1, 0, 0, 0, 0, 0, 0, 0, -x, 0, 0});
+        ofDerivatives.addRow({0, 0, 1, 0, 0, 0, 0, 0, 0, 0, -x, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, 0, 0, 0, 0, -X, -Y, -Z, -1});
+        ofDerivatives.addRow({0, 0, 0, 0, 1, 0, 0, 0, -y, 0, 0, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, 0, 1, 0, 0, 0, -y, 0, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, 0, 0, 1, 0, 0, 0, -y, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, 0, 0, 0, 0, -X, -Y, -Z, -1});
+        ofDerivatives.addRow({-y, 0, 0, 0, x, 0, 0, 0, 0, 0, 0, 0});
+        ofDerivatives.addRow({0, -y, 0, 0, 0, x, 0, 0, 0, 0, 0, 0});
+        ofDerivatives.addRow({0, 0, -y, 0, 0, 0, x, 0, 0, 0, 0, 0});
+        ofDerivatives.addRow({0, 0, 0, 0, X, Y, Z, 1, 0, 0, 0, 0});
+        ofDerivatives.addRow({-X, -Y, -Z, -1, 0, 0, 0, 0, 0, 0, 0, 0});
+    }
+    kelMat M, N, lambda, V;
+    ofRows.get(M, static_cast<float>(n));
+    ofDerivatives.get(N, static_cast<float>(n));
+    printBlock("M", M);
+    printBlock("N", N);
+    N.getGeneralizedEigenValue(M, lambda, V);
+    const int k = chooseEigenvalue(lambda);
+    printBlock("eigenvalue", lambda);
+    kel::eigenvectorOrNaN<kUnknowns>(V, k, m_Data);
+    setDataUnitize();
+    printBlock("result", *this);
+    return true;
+}
+
+bool kelMatEstimatorP::estimate_byRANSAC_fine(kelMatCorrespP& corresp, float threshold) {
+    constexpr int kSample = 6, kMostDraws = 1500, kEnoughInliers = 400;
+    const int n = corresp.m_Num;
+    if (n < kLeastPairs)
+        return false;
+    kelMatCorrespP normalized;
+    kelMat T1, T2;
+    corresp.normalize(normalized, T1, T2);
+
+    kel::Marks current(n), chosen(n);
+    kel::LocalMat<2 * kSample * kUnknowns> sample(2 * kSample, kUnknowns);
+    int best = 0, draws = kMostDraws, draw = 0;
+    do {
+        int index[kSample];
+        getRandomIndex(n, index[0], index[1], index[2], index[3], index[4], index[5]);
+        for (int i = 0; i < kSample; ++i)
+            fillRows(sample[2 * i], normalized, index[i]);
+        solve(*this, sample);
+        kel::denormalize<4>(*this, T2, T1);
+        if (judgeMatrixP(*this)) {
+            const int count = countProjections(*this, corresp, threshold, best, current.bytes());
+            if (count > best) {
+                const double needed = kel::drawsNeeded(count, n);
+                if (draws > needed)
+                    draws = kel::truncated(needed);
+                std::swap(current, chosen);
+                best = count;
+            }
+        }
+    } while (best < kEnoughInliers && ++draw < draws);
+
+    for (;;) {
+        if (best < kLeastPairs)
+            return false;
+        kelMat A(2 * best, kUnknowns, false);
+        for (int i = 0, row = 0; i < n; ++i)
+            if (chosen[i]) {
+                fillRows(A[row], normalized, i);
+                row += 2;
+            }
+        solve(*this, A);
+        kel::denormalize<4>(*this, T2, T1);
+        if (!judgeMatrixP(*this))
+            return false;
+        const int count = countProjections(*this, corresp, threshold, kel::kCountAll, chosen.bytes());
+        if (count <= best)
+            return true;
+        best = count;
+    }
+}
+
+void getRandomIndex(int n, int& a, int& b, int& c, int& d, int& e, int& f) {
+    int* const drawn[] = {&a, &b, &c, &d, &e, &f};
+    for (int i = 0; i < 6; ++i) {
+        const auto repeated = [&] {
+            return std::any_of(drawn, drawn + i, [&](const int* earlier) { return *earlier == *drawn[i]; });
+        };
+        do
+            *drawn[i] = rand() % n;
+        while (repeated());
+    }
+}
+
+bool judgeMatrixP(kelMat&) {
+    return true;
+}
+
+int judgeInliers(kelMat& P, kelMatCorrespP& corresp, std::vector<bool>& mask, float threshold) {
+    const int n = corresp.m_Num;
+    if (n < 1)
+        return 0;
+    if (P.m_Width != 4 || P.m_Height != 3) {
+        float x, y;
+        P.cvtPoint(0.0f, 0.0f, 0.0f, &x, &y); // stops the process on the size
+    }
+    kel::Marks marks(n);
+    const int count = countProjections(P, corresp, threshold, kel::kCountAll, marks.bytes());
+    kel::copyMarks(mask, marks, n);
+    return count;
+}

@@ -1,0 +1,507 @@
+// Correspondence sets, homography and projection estimators against plain references, bit for bit, and against the truth.
+#include <cmath>
+#include <cstring>
+#include <functional>
+#include <limits>
+
+#include "EstimatorReference.h"
+#include "Random.h"
+#include "Stops.h"
+
+namespace {
+
+constexpr float kNaN = std::numeric_limits<float>::quiet_NaN();
+
+// Equal bits; any NaN equals any other.
+testing::AssertionResult sameBits(const kelMat& A, const kelMat& B) {
+    if (A.m_Width != B.m_Width || A.m_Height != B.m_Height)
+        return testing::AssertionFailure() << "sizes differ";
+    for (int i = 0; i < A.m_Width * A.m_Height; ++i)
+        if (std::memcmp(A.m_Data + i, B.m_Data + i, 4) != 0 && !(std::isnan(A.m_Data[i]) && std::isnan(B.m_Data[i])))
+            return testing::AssertionFailure() << "element " << i << " is " << A.m_Data[i] << ", expected " << B.m_Data[i];
+    return testing::AssertionSuccess();
+}
+
+float uniform(std::mt19937& random, float lo, float hi) {
+    return std::uniform_real_distribution<float>(lo, hi)(random);
+}
+
+kelMat homography(std::mt19937& random) {
+    kelMat H(3, 3, true);
+    H.setDataIdentity(1);
+    H[0][0] = uniform(random, 0.6f, 1.6f);
+    H[0][1] = uniform(random, -0.3f, 0.3f);
+    H[0][2] = uniform(random, -80, 80);
+    H[1][0] = uniform(random, -0.3f, 0.3f);
+    H[1][1] = uniform(random, 0.6f, 1.6f);
+    H[1][2] = uniform(random, -80, 80);
+    H[2][0] = uniform(random, -2e-4f, 2e-4f);
+    H[2][1] = uniform(random, -2e-4f, 2e-4f);
+    return H;
+}
+
+void addPairs(kelMatCorrespH& set, kelMat H, int n, float noise, float outliers, std::mt19937& random) {
+    for (int i = 0; i < n; ++i) {
+        const float x = uniform(random, 0, 640), y = uniform(random, 0, 480);
+        float u, v;
+        H.cvtPoint(x, y, &u, &v);
+        if (uniform(random, 0, 1) < outliers)
+            set.add(x, y, uniform(random, 0, 640), uniform(random, 0, 480));
+        else
+            set.add(x, y, u + uniform(random, -noise, noise), v + uniform(random, -noise, noise));
+    }
+}
+
+kelMat projection(std::mt19937& random) {
+    kelMatGeneratorP generator;
+    srand(random());
+    generator.setMatView(uniform(random, 500, 1000));
+    generator.setMatViewShift(320, 240);
+    generator.setMatObjectRandom(-40, 40, -40, 40, -180, 180, -200, 200, -200, 200, 2500, 3500);
+    kelMat P;
+    generator.getMat(P);
+    P.setDataUnitize();
+    return P;
+}
+
+void addPairs(kelMatCorrespP& set, kelMat P, int n, float noise, float outliers, std::mt19937& random) {
+    for (int i = 0; i < n; ++i) {
+        const float X = uniform(random, -500, 500), Y = uniform(random, -500, 500), Z = uniform(random, -500, 500);
+        float u, v;
+        P.cvtPoint(X, Y, Z, &u, &v);
+        if (uniform(random, 0, 1) < outliers)
+            set.add(X, Y, Z, uniform(random, 0, 640), uniform(random, 0, 480));
+        else
+            set.add(X, Y, Z, u + uniform(random, -noise, noise), v + uniform(random, -noise, noise));
+    }
+}
+
+// Largest distance between the images of points under two homographies.
+float distanceOf(kelMat A, kelMat B) {
+    float worst = 0;
+    for (float x : {0.f, 320.f, 640.f})
+        for (float y : {0.f, 240.f, 480.f}) {
+            float u, v, s, t;
+            A.cvtPoint(x, y, &u, &v);
+            B.cvtPoint(x, y, &s, &t);
+            worst = std::max(worst, std::hypot(u - s, v - t));
+        }
+    return worst;
+}
+
+float distanceOfProjections(kelMat A, kelMat B) {
+    float worst = 0;
+    for (float X : {-500.f, 500.f})
+        for (float Y : {-500.f, 500.f})
+            for (float Z : {-500.f, 500.f}) {
+                float u, v, s, t;
+                A.cvtPoint(X, Y, Z, &u, &v);
+                B.cvtPoint(X, Y, Z, &s, &t);
+                worst = std::max(worst, std::hypot(u - s, v - t));
+            }
+    return worst;
+}
+
+} // namespace
+
+TEST(Correspondences, StopGrowingSilentlyAtTheirMost) {
+    kelMatCorrespH h;
+    kelMatCorrespP p;
+    for (int i = 0; i < 10001; ++i) {
+        h.add(float(i), 1, 2, 3);
+        p.add(float(i), 1, 2, 3, 4);
+    }
+    EXPECT_EQ(h.m_Num, 10000);
+    EXPECT_EQ(h.m_DstY.size(), 10000u);
+    EXPECT_EQ(h.m_SrcX.back(), 9999);
+    EXPECT_EQ(p.m_Num, 10000);
+    EXPECT_EQ(p.m_ImgY.size(), 10000u);
+}
+
+TEST(Correspondences, NormaliseAsTheReferenceDoes) {
+    std::mt19937 random = kel_test::generator(71);
+    for (int n : {0, 1, 2, 3, 5, 17, 1000}) {
+        kelMatCorrespH h, h1, h2;
+        kelMatCorrespP p, p1, p2;
+        addPairs(h, homography(random), n, 1, 0.3f, random);
+        addPairs(p, projection(random), n, 1, 0.3f, random);
+        kelMat A1(2, 2, true), A2, B1, B2;
+        h.normalize(h1, A1, A2);
+        kel_ref::normalize(h, h2, B1, B2);
+        EXPECT_TRUE(sameBits(A1, B1));
+        EXPECT_TRUE(sameBits(A2, B2));
+        EXPECT_EQ(h1.m_Num, n);
+        if (n > 1) {
+            EXPECT_EQ(h1.m_SrcX, h2.m_SrcX);
+            EXPECT_EQ(h1.m_SrcY, h2.m_SrcY);
+            EXPECT_EQ(h1.m_DstX, h2.m_DstX);
+            EXPECT_EQ(h1.m_DstY, h2.m_DstY);
+        }
+        p.normalize(p1, A1, A2);
+        kel_ref::normalize(p, p2, B1, B2);
+        EXPECT_TRUE(sameBits(A1, B1));
+        EXPECT_TRUE(sameBits(A2, B2));
+        if (n > 1) {
+            EXPECT_EQ(p1.m_ObjX, p2.m_ObjX);
+            EXPECT_EQ(p1.m_ObjY, p2.m_ObjY);
+            EXPECT_EQ(p1.m_ObjZ, p2.m_ObjZ);
+            EXPECT_EQ(p1.m_ImgX, p2.m_ImgX);
+            EXPECT_EQ(p1.m_ImgY, p2.m_ImgY);
+        }
+    }
+}
+
+TEST(Correspondences, NormaliseIntoAFilledSetScalesItsFirstEntries) {
+    kelMatCorrespH in, out;
+    in.add(0, 0, 0, 0);
+    in.add(2, 0, 0, 4);
+    out.add(10, 20, 30, 40);
+    kelMat T1, T2;
+    in.normalize(out, T1, T2);
+    EXPECT_EQ(out.m_Num, 3);
+    const float s1 = T1[0][0];
+    EXPECT_EQ(out.m_SrcX, (std::vector<float>{10 * s1, -1 * s1, 1}));
+}
+
+TEST(Correspondences, NormaliseRefusesShortSequencesAndLeavesTheOutputAlone) {
+    kelMatCorrespH h, out;
+    h.add(1, 2, 3, 4);
+    h.m_Num = 2;
+    kelMat T1, T2;
+    EXPECT_THROW(h.normalize(out, T1, T2), std::out_of_range);
+    EXPECT_EQ(out.m_Num, 0);
+    kelMatCorrespP p, pOut;
+    p.add(1, 2, 3, 4, 5);
+    p.m_ImgY.clear();
+    EXPECT_THROW(p.normalize(pOut, T1, T2), std::out_of_range);
+    EXPECT_THROW(kelMatEstimatorP().estimate_byLSM_fine((p.m_Num = 6, p)), std::out_of_range);
+}
+
+TEST(UnitSquare, TakesItsCornersInOrder) {
+    float h[9] = {0, 0, 0, 0, 0, 0, 0, 0, 77};
+    UnitSquareProjection(10, 20, 110, 25, 120, 130, 5, 115, h);
+    EXPECT_EQ(h[8], 77) << "eight values are written";
+    h[8] = 1;
+    kelMat H(3, 3, false);
+    H.setData(h);
+    const float corners[4][4] = {{0, 0, 10, 20}, {0, 1, 110, 25}, {1, 1, 120, 130}, {1, 0, 5, 115}};
+    for (const float* c : corners) {
+        float u, v;
+        H.cvtPoint(c[0], c[1], &u, &v);
+        EXPECT_NEAR(u, c[2], 1e-3);
+        EXPECT_NEAR(v, c[3], 1e-3);
+    }
+    UnitSquareProjection(0, 0, 1, 1, 2, 2, 3, 3, h);
+    EXPECT_FALSE(std::isfinite(h[0]));
+}
+
+TEST(FourPoints, GiveTheHomographyThroughThem) {
+    std::mt19937 random = kel_test::generator(72);
+    for (int round = 0; round < 50; ++round) {
+        kelMat truth = homography(random);
+        kelMatCorrespH s;
+        const float corners[4][2] = {{20, 30}, {40, 450}, {600, 440}, {620, 10}};
+        for (const float* c : corners) {
+            float u, v;
+            truth.cvtPoint(c[0], c[1], &u, &v);
+            s.add(c[0], c[1], u, v);
+        }
+        kelMatEstimatorH H;
+        EXPECT_EQ(H.getNorm(), 0);
+        const auto &x = s.m_SrcX, &y = s.m_SrcY, &u = s.m_DstX, &v = s.m_DstY;
+        EXPECT_TRUE(
+            H.estimate_by4P(x[0], y[0], u[0], v[0], x[1], y[1], u[1], v[1], x[2], y[2], u[2], v[2], x[3], y[3], u[3], v[3]));
+        EXPECT_LT(distanceOf(H, truth), 1.0f);
+    }
+    kelMatEstimatorH H;
+    EXPECT_TRUE(H.estimate_by4P(0, 0, 0, 0, 1, 1, 1, 1, 2, 2, 2, 2, 3, 3, 3, 3)) << "on a line";
+    EXPECT_FALSE(std::isfinite(H[0][0]));
+}
+
+TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
+    std::mt19937 random = kel_test::generator(73);
+    for (int n : {5, 6, 7, 20, 101, 2000}) {
+        kelMat truth = homography(random), P = projection(random);
+        kelMatCorrespH h;
+        kelMatCorrespP p;
+        addPairs(h, truth, n, n > 6 ? 0.5f : 0, 0, random);
+        addPairs(p, P, n, n > 6 ? 0.5f : 0, 0, random);
+        kelMatEstimatorH H, expected;
+        EXPECT_TRUE(H.estimate_byLSM(h));
+        kel_ref::leastSquares(expected, h);
+        EXPECT_TRUE(sameBits(H, expected));
+        EXPECT_TRUE(H.estimate_byLSM_fine(h));
+        kel_ref::leastSquaresFine(expected, h, 5);
+        EXPECT_TRUE(sameBits(H, expected));
+        EXPECT_NEAR(H[2][2], 1, 1e-6);
+        EXPECT_LT(distanceOf(H, truth), n == 7 ? 60.0f : 8.0f) << n;
+        if (n < 6)
+            continue;
+        kelMatEstimatorP Q, expectedP;
+        EXPECT_TRUE(Q.estimate_byLSM(p));
+        kel_ref::leastSquares(expectedP, p);
+        EXPECT_TRUE(sameBits(Q, expectedP));
+        EXPECT_TRUE(Q.estimate_byLSM_fine(p));
+        kel_ref::leastSquaresFine(expectedP, p, 6);
+        EXPECT_TRUE(sameBits(Q, expectedP));
+        if (n >= 20) {
+            EXPECT_LT(distanceOfProjections(Q, P), 6.0f) << n;
+        }
+    }
+}
+
+// On noisy data: with exact pairs the factorised matrix is singular, and rounding decides.
+TEST(Taubin, EqualsTheReferenceAndFindsTheTruth) {
+    std::mt19937 random = kel_test::generator(74);
+    for (int n : {20, 100, 1000}) {
+        kelMat truth = homography(random), P = projection(random);
+        kelMatCorrespH wide, h;
+        kelMatCorrespP wideP, p;
+        addPairs(wide, truth, n, 1.0f, 0, random);
+        addPairs(wideP, P, n, 1.0f, 0, random);
+        kelMat T1, T2;
+        wide.normalize(h, T1, T2);
+        kelMatEstimatorH H, expected;
+        EXPECT_TRUE(H.estimate_byTaubin(h));
+        kel_ref::taubin(expected, h);
+        EXPECT_TRUE(sameBits(H, expected));
+        kel_ref::denormalize(H, T2, T1);
+        EXPECT_LT(distanceOf(H, truth), 8.0f) << n;
+
+        wideP.normalize(p, T1, T2);
+        kelMatEstimatorP Q, expectedP;
+        testing::internal::CaptureStdout();
+        EXPECT_TRUE(Q.estimate_byTaubin(p));
+        const std::string printed = testing::internal::GetCapturedStdout();
+        testing::internal::CaptureStdout();
+        kel_ref::taubin(expectedP, p);
+        EXPECT_EQ(printed, testing::internal::GetCapturedStdout());
+        EXPECT_TRUE(sameBits(Q, expectedP));
+        EXPECT_EQ(printed.compare(0, 8, "M\n<mat>\n"), 0);
+    }
+}
+
+TEST(Taubin, FillsWithNaNWhereTheEigenproblemHasNoSolution) {
+    testing::internal::CaptureStdout();
+    kelMatCorrespH onAxis, notANumber, atOrigin;
+    kelMatCorrespP plane;
+    for (int i = 0; i < 8; ++i) {
+        onAxis.add(float(i), 0, float(i), 0);
+        atOrigin.add(0, 0, 0, 0);
+        notANumber.add(kNaN, float(i), 1, float(i * i));
+        plane.add(float(i), float(i * i % 5), 0, float(i), float(i % 3));
+    }
+    for (kelMatCorrespH* set : {&onAxis, &notANumber, &atOrigin}) {
+        kelMatEstimatorH H;
+        EXPECT_TRUE(H.estimate_byTaubin(*set));
+        EXPECT_EQ(H.m_Width, 3);
+        EXPECT_TRUE(std::isnan(H[0][0]));
+    }
+    kelMatEstimatorP P;
+    EXPECT_TRUE(P.estimate_byTaubin(plane));
+    EXPECT_EQ(P.m_Width, 4);
+    EXPECT_TRUE(std::isnan(P[0][0]));
+    testing::internal::GetCapturedStdout();
+}
+
+TEST(Fits, RefuseSmallSetsAndKeepTheirContents) {
+    testing::internal::CaptureStdout();
+    std::mt19937 random = kel_test::generator(75);
+    kelMatCorrespH h;
+    kelMatCorrespP p;
+    addPairs(h, homography(random), 4, 0, 0, random);
+    addPairs(p, projection(random), 5, 0, 0, random);
+    kelMatEstimatorH H;
+    kelMatEstimatorP P;
+    H.setDataIdentity(3);
+    P.setDataIdentity(3);
+    const kelMat beforeH = H, beforeP = P;
+    EXPECT_FALSE(H.estimate_byLSM(h) || H.estimate_byLSM_fine(h) || H.estimate_byTaubin(h));
+    EXPECT_FALSE(P.estimate_byLSM(p) || P.estimate_byLSM_fine(p) || P.estimate_byTaubin(p) || P.estimate_byRANSAC_fine(p, 1));
+    kelMatCorrespH three;
+    addPairs(three, homography(random), 3, 0, 0, random);
+    int count = 99;
+    EXPECT_FALSE(H.estimate_byRANSAC_fine(three, 1, &count));
+    EXPECT_TRUE(sameBits(H, beforeH));
+    EXPECT_TRUE(sameBits(P, beforeP));
+    EXPECT_EQ(count, 99);
+    EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
+}
+
+TEST(RandomIndex, DrawsInOrderAndLetsTheThirdOfFourEqualTheFirst) {
+    int a, b, c, d, e, f;
+    bool thirdIsFirst = false;
+    for (unsigned seed = 0; seed < 300; ++seed) {
+        srand(seed);
+        getRandomIndex(a, b, c, d, 4);
+        EXPECT_TRUE(b != a && c != b && d != a && d != b && d != c);
+        thirdIsFirst = thirdIsFirst || c == a;
+        getRandomIndex(6, a, b, c, d, e, f);
+        EXPECT_EQ((1 << a | 1 << b | 1 << c | 1 << d | 1 << e | 1 << f), 63);
+    }
+    EXPECT_TRUE(thirdIsFirst);
+}
+
+TEST(Plausibility, HasAbsoluteBoundsThatNaNPasses) {
+    const auto judge = [](std::function<void(kelMat&)> change) {
+        kelMat H(3, 3, true);
+        H.setDataIdentity(1);
+        change(H);
+        return judgeHomography(H);
+    };
+    EXPECT_TRUE(judge([](kelMat&) {}));
+    for (int i : {0, 1}) {
+        EXPECT_TRUE(judge([=](kelMat& H) { H[i][i] = 4; }));
+        EXPECT_FALSE(judge([=](kelMat& H) { H[i][i] = std::nextafter(4.0f, 5.0f); }));
+        EXPECT_TRUE(judge([=](kelMat& H) { H[i][i] = 0.1f; })) << "the float 0.1 lies above the double";
+        EXPECT_FALSE(judge([=](kelMat& H) { H[i][i] = std::nextafter(0.1f, 0.0f); }));
+        EXPECT_FALSE(judge([=](kelMat& H) { H[i][i] = -1; })) << "a mirror";
+        EXPECT_FALSE(judge([=](kelMat& H) { H[2][i] = 0.002f; })) << "the float 0.002 lies above the double";
+        EXPECT_TRUE(judge([=](kelMat& H) { H[2][i] = 0.001f; }));
+    }
+    EXPECT_TRUE(judge([](kelMat& H) { H[0][1] = H[1][0] = H[0][0] = H[1][1] = 1; })) << "zero area passes";
+    EXPECT_TRUE(judge([](kelMat& H) { std::fill_n(H.m_Data, 9, kNaN); }));
+    EXPECT_TRUE([] {
+        kelMat zero(3, 4, true);
+        return judgeMatrixP(zero);
+    }());
+}
+
+TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
+    std::mt19937 random = kel_test::generator(76);
+    for (int n : {0, 1, 2, 3, 4, 5, 7, 8, 9, 15, 16, 17, 255, 256, 257, 513}) {
+        kelMat H = homography(random), P = projection(random);
+        kelMatCorrespH h;
+        kelMatCorrespP p;
+        addPairs(h, H, n, 2, 0.3f, random);
+        addPairs(p, P, n, 2, 0.3f, random);
+        if (n > 5)
+            h.m_SrcX[5] = p.m_ObjX[5] = kNaN;
+        for (float threshold : {0.0f, 0.5f, 1.5f, -1.5f, 1e20f}) {
+            std::vector<bool> mask(n + 3, true), expected(n + 3, true);
+            EXPECT_EQ(judgeInliers(H, h, mask, threshold), kel_ref::inliers(H, h, expected, threshold));
+            EXPECT_EQ(mask, expected);
+            EXPECT_EQ(judgeInliers(P, p, mask, threshold), kel_ref::inliers(P, p, expected, threshold));
+            EXPECT_EQ(mask, expected);
+        }
+    }
+    kelMatCorrespH onBound;
+    onBound.add(0, 0, 3, 4);
+    kelMat identity(3, 3, true);
+    identity.setDataIdentity(1);
+    std::vector<bool> mask(1);
+    EXPECT_EQ(judgeInliers(identity, onBound, mask, 5), 0) << "a pair at the threshold is an outlier";
+    kelMat wrong(3, 4, true);
+    EXPECT_STOPS(judgeInliers(wrong, onBound, mask, 5), "this->m_Width == 3 && this->m_Height == 3", "kelMat/src/kelMat.cpp",
+                 "void kelMat::cvtPoint(float, float, float*, float*)");
+}
+
+TEST(Ransac, EqualsTheReferenceToTheBitAndToTheDraw) {
+    std::mt19937 random = kel_test::generator(77);
+    for (int n : {4, 5, 6, 7, 10, 30, 49, 50, 60, 120, 450})
+        for (float outliers : {0.0f, 0.2f, 0.5f, 0.8f, 1.0f}) {
+            kelMatCorrespH h;
+            addPairs(h, homography(random), n, 1, outliers, random);
+            const unsigned seed = random();
+            kelMatEstimatorH H, expected;
+            int count = -5, expectedCount = -5;
+            srand(seed);
+            const bool ok = H.estimate_byRANSAC_fine(h, 2, &count);
+            const int next = rand();
+            srand(seed);
+            EXPECT_EQ(ok, kel_ref::ransac(expected, h, 2, &expectedCount, {5, 4, 50, true})) << n << " " << outliers;
+            EXPECT_EQ(next, rand()) << "draws of " << n << " pairs, outliers " << outliers;
+            EXPECT_EQ(count, expectedCount);
+            EXPECT_TRUE(sameBits(H, expected));
+            if (n >= 6 && (n < 100 || outliers < 0.4f)) {
+                kelMatCorrespP p;
+                addPairs(p, projection(random), n, 1, outliers, random);
+                kelMatEstimatorP P, expectedP;
+                srand(seed);
+                const bool okP = P.estimate_byRANSAC_fine(p, 4);
+                const int nextP = rand();
+                srand(seed);
+                EXPECT_EQ(okP, kel_ref::ransac(expectedP, p, 4, nullptr, {6, 6, 400, false})) << n << " " << outliers;
+                EXPECT_EQ(nextP, rand());
+                EXPECT_TRUE(sameBits(P, expectedP));
+            }
+        }
+}
+
+TEST(Ransac, FindsTheTruthAmongOutliers) {
+    std::mt19937 random = kel_test::generator(78);
+    int near = 0;
+    for (int round = 0; round < 20; ++round) {
+        kelMat truth = homography(random);
+        kelMatCorrespH h;
+        addPairs(h, truth, 200, 0.5f, 0.4f, random);
+        kelMatEstimatorH H;
+        srand(random());
+        near += H.estimate_byRANSAC_fine(h, 3, nullptr) && distanceOf(H, truth) < 3;
+    }
+    EXPECT_GE(near, 18);
+
+    kelMat mirror(3, 3, true);
+    mirror.setDataIdentity(1);
+    mirror[0][0] = -1;
+    mirror[0][2] = 640;
+    kelMatCorrespH h;
+    addPairs(h, mirror, 100, 0, 0, random);
+    kelMatEstimatorH H;
+    EXPECT_FALSE(H.estimate_byRANSAC_fine(h, 3, nullptr)) << "a mirror is never returned";
+}
+
+TEST(Generator, ComposesObjectCameraAndView) {
+    kelMatGeneratorP generator;
+    kelMat P;
+    generator.getMat(P);
+    EXPECT_EQ(P.getNorm(), 0) << "no focal length yet";
+    EXPECT_EQ(P.m_Width, 4);
+    const auto expect = [&](std::vector<float> values) {
+        generator.getMat(P);
+        for (int i = 0; i < 12; ++i)
+            EXPECT_EQ(P.m_Data[i], values[i]) << i;
+    };
+    generator.setMatView(500);
+    expect({500, 0, 0, 0, 0, 500, 0, 0, 0, 0, 1, 3000});
+    generator.setMatObjectScale(2);
+    expect({250, 0, 0, 0, 0, 250, 0, 0, 0, 0, 0.5f, 3000});
+    generator.setMatViewShift(3, 4);
+    expect({250, 0, 1.5f, 9000, 0, 250, 2, 12000, 0, 0, 0.5f, 3000});
+    generator.setMatObjectShift(8, 16, 32);
+    expect({250, 0, 1.5f, 11048, 0, 250, 2, 16064, 0, 0, 0.5f, 3016});
+    generator.setMatViewScale(2);
+    expect({500, 0, 3, 22096, 0, 500, 4, 32128, 0, 0, 1, 6032});
+
+    generator.setMatCamera(10, 20, 30, 1, 2, 3);
+    kelMat R;
+    R.setDataRotationMatrix_XYZ_3x3(10, 20, 30);
+    EXPECT_EQ(generator.matCamera[1][2], R[1][2]);
+    EXPECT_EQ(generator.matCamera[2][3], 3);
+    const kelMat product = generator.matCamera * generator.matCameraInverse;
+    for (int i = 0; i < 16; ++i)
+        EXPECT_NEAR(product.m_Data[i], i % 5 == 0, 1e-6);
+}
+
+TEST(Generator, DrawsItsValuesInArgumentOrder) {
+    const auto draw = [](float a, float b) {
+        const float lo = std::min(a, b), hi = std::max(a, b);
+        return ((hi - lo) * static_cast<float>(rand())) * 4.656612873077393e-10f + lo;
+    };
+    kelMatGeneratorP random, fixed;
+    srand(31);
+    random.setMatViewRandom(900, 300);
+    random.setMatCameraRandom(1, 10, 20, 2, 3, 30, 4, 40, 5, 50, 60, 6);
+    random.setMatObjectRandom(1, 10, 20, 2, 3, 30, 4, 40, 5, 50, 60, 6);
+    srand(31);
+    fixed.setMatView(draw(900, 300));
+    for (void (kelMatGeneratorP::*set)(float, float, float, float, float, float) :
+         {&kelMatGeneratorP::setMatCamera, &kelMatGeneratorP::setMatObject}) {
+        const float a = draw(1, 10), b = draw(20, 2), c = draw(3, 30), d = draw(4, 40), e = draw(5, 50), f = draw(60, 6);
+        (fixed.*set)(a, b, c, d, e, f);
+    }
+    kelMat P, expected;
+    random.getMat(P);
+    fixed.getMat(expected);
+    EXPECT_TRUE(sameBits(P, expected));
+}
