@@ -31,7 +31,7 @@ struct Rotation {
     float c, s;
 };
 
-// Rotates N tiles, `tileFloats` apart. The second column of a rotation stays in registers, as it mostly is the first of the next.
+// Rotates N tiles, `tileFloats` apart. The second column of a rotation, mostly the first of the next, stays in registers.
 template <int N> void rotate(float* tiles, ptrdiff_t tileFloats, const Rotation* begin, const Rotation* end) {
     if (begin == end)
         return;
@@ -561,7 +561,8 @@ private:
             if (w[i] == 0.0f) {
                 U.fromRow(i, [&](float* tile, int, int) KEL_INLINE { fill4(tile + kLanes * i, 0.0f); });
                 U.at(i, i) += 1.0f;
-                dots(i - 1, i - 1, n, i);
+                if (i > 0)
+                    dots(i - 1, i - 1, n, i);
                 continue;
             }
             const float reciprocal = 1.0f / w[i], diagonal = U.at(i, i);
