@@ -76,8 +76,6 @@ public:
         : m_rows(M.m_Height), m_columns(M.m_Width), m_full(M.m_Height / kLanes), m_floats(ptrdiff_t(kLanes) * M.m_Width),
           m_data(M.m_Data), m_last(m_floats), m_spare(m_floats) {}
 
-    int rows() const { return m_rows; }
-    int columns() const { return m_columns; }
     ptrdiff_t floats() const { return m_floats; }
     int count() const { return (m_rows + kLanes - 1) / kLanes; }
     float* operator[](int tile) { return tile < m_full ? m_data + m_floats * tile : m_last.data(); }
