@@ -65,8 +65,8 @@ public:
     /// Multiplies every element by the reciprocal of the last one (bottom right), so that it becomes 1; a zero there gives
     /// infinities or NaN.
     KEL_API void setDataUnitize();
-    /// Writes the matrix to standard output: a line <mat name="..."> (<mat> for a null name), one line a row in "%8.3f "
-    /// each, </mat>.
+    /// Writes the matrix to standard output: a line `<mat name="...">` (`<mat>` for a null name), one line a row with each
+    /// element as "%8.3f ", and a line `</mat>`.
     KEL_API void print(const char* name);
 
     /// @name Arithmetic
@@ -188,6 +188,7 @@ public:
  * LU decomposition of a row permutation, in place, by Crout's method with implicit pivoting (Press et al., Numerical Recipes
  * in C, 2nd ed., section 2.3). The order n is a.m_Width.
  *
+ * @param a    becomes the factors: U with its diagonal, L below it without its diagonal of ones
  * @param indx n ints: the row swapped into each place
  * @param d    +1 or -1, the parity of the swaps
  * @return false for a row of zeros (`a` as it was). A pivot of 0 becomes 1.0e-40 and counts as success.
@@ -217,7 +218,10 @@ KEL_API bool nr_svdcmp(const kelMat& a, kelMat& u, kelMat& w, kelMat& v);
  */
 KEL_API bool nr_jacobi(kelMat& a, kelMat& d, kelMat& v, int* nrot);
 
-/** @name Determinants and inverses without size checks @{ */
+/**
+ * @name Determinants and inverses without size checks
+ * @{
+ */
 KEL_API float kel_getDeterminant_2x2(const kelMat& A);
 KEL_API float kel_getDeterminant_3x3(const kelMat& A);
 KEL_API float kel_getDeterminant_NxN(const kelMat& A);
