@@ -12,18 +12,15 @@ using kel::store8;
 
 namespace {
 
-// Whole blocks: body(d, s) turns N units of S bytes into as many of D bytes. What is left of a row goes through a buffer, so
-// that nothing beside the row's own units is read or written.
+// A row in blocks; body(d, s) turns N units of S bytes into as many of D bytes. What is left of the row goes through a buffer,
+// so that nothing beside the row's own units is read or written.
 template <int N, int D, int S, class Body> void alongRow(uint8_t* d, const uint8_t* s, kelValue_s32 units, Body body) {
-    for (; units >= N; units -= N, d += N * D, s += N * S) {
-        kel::prefetchWrite(d);
-        body(d, s);
-    }
-    if (units > 0) {
+    const ptrdiff_t rest = kel::walkBlocks<N, D, S>(d, s, units, body);
+    if (rest > 0) {
         uint8_t in[N * S] = {}, out[N * D];
-        memcpy(in, s, static_cast<size_t>(units) * S);
+        memcpy(in, s, static_cast<size_t>(rest) * S);
         body(out, in);
-        memcpy(d, out, static_cast<size_t>(units) * D);
+        memcpy(d, out, static_cast<size_t>(rest) * D);
     }
 }
 
