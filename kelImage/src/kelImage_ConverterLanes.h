@@ -1,43 +1,11 @@
 // Vector building blocks that the portable and the vector converters share: grey spread over channels, and the products of YUV
-// to colour, up to where the two forms part. Rests on SSE4.1 alone.
+// to colour, up to where the two forms part.
 #ifndef KEL_IMAGE_CONVERTER_LANES_H
 #define KEL_IMAGE_CONVERTER_LANES_H
 
-#include <smmintrin.h>
-#include <stddef.h>
-#include <stdint.h>
+#include "kelImage_Blocks.h"
 
 namespace kel {
-
-inline __m128i load16(const uint8_t* src) {
-    return _mm_loadu_si128(reinterpret_cast<const __m128i*>(src));
-}
-inline __m128i load8(const uint8_t* src) {
-    return _mm_loadl_epi64(reinterpret_cast<const __m128i*>(src));
-}
-inline void store16(uint8_t* dst, __m128i value) {
-    _mm_storeu_si128(reinterpret_cast<__m128i*>(dst), value);
-}
-inline void store8(uint8_t* dst, __m128i value) {
-    _mm_storel_epi64(reinterpret_cast<__m128i*>(dst), value);
-}
-
-// Calls body(d, s) for each whole block of N units, of D bytes in the destination and S bytes in the source, moves both pointers
-// behind the last of them, and returns the units left. Large images are bound by fetching the lines to be written, so these are
-// asked for ahead (harmless behind the end), each once in a group of blocks.
-template <int N, int D, int S, class Body>
-inline ptrdiff_t walkBlocks(uint8_t*& d, const uint8_t*& s, ptrdiff_t units, Body body) {
-    constexpr int group = 4, line = 64, ahead = 24 * line;
-    for (; units >= group * N; units -= group * N) {
-        for (int byte = 0; byte < group * N * D; byte += line)
-            _mm_prefetch(reinterpret_cast<const char*>(d + ahead + byte), _MM_HINT_T0);
-        for (int i = 0; i < group; ++i, d += N * D, s += N * S)
-            body(d, s);
-    }
-    for (; units >= N; units -= N, d += N * D, s += N * S)
-        body(d, s);
-    return units;
-}
 
 // Writes 16 grey values as 16 pixels of N channels, the fourth being 0. Index -1 of a shuffle gives 0.
 template <int N> inline void storeGrey(uint8_t* dst, __m128i grey) {
