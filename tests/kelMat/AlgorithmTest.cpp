@@ -168,6 +168,16 @@ TEST(NrLudcmp, EqualsThePlainLoops) {
         });
 }
 
+TEST(NrLubksb, InvertsLikeThePlainLoops) {
+    for (int n = 4; n <= 24; ++n)
+        forAllInputs(n, n, [](const kelMat& A) {
+            kelMat R;
+            Reference expected;
+            ASSERT_EQ(A.getInversedMatrix(R), kel_ref::inverse(reference(A), expected));
+            ASSERT_TRUE(same(R, expected)) << "infinities of a singular column included";
+        });
+}
+
 TEST(NrLubksb, SolvesAndSkipsLeadingZeros) {
     kelMat a = mat({{4, 3}, {6, 3}});
     int indx[2];
