@@ -69,8 +69,8 @@ public:
     /// Multiplies every element by the reciprocal of the last one (bottom right), so that it becomes 1; a zero there gives
     /// infinities or NaN.
     KEL_API void setDataUnitize();
-    /// Writes the matrix to standard output: a line <mat name="..."> (<mat> for a null name), one line a row in "%8.3f "
-    /// each, </mat>.
+    /// Writes the matrix to standard output: a line `<mat name="...">` (`<mat>` for a null name), one line a row in "%8.3f "
+    /// each, `</mat>`.
     KEL_API void print(const char* name);
 
     /// @name Arithmetic
@@ -314,21 +314,45 @@ public:
     /// infinities or NaN.
     KEL_API bool estimate_by4P(float x1_0, float y1_0, float x2_0, float y2_0, float x1_1, float y1_1, float x2_1, float y2_1,
                                float x1_2, float y1_2, float x2_2, float y2_2, float x1_3, float y1_3, float x2_3, float y2_3);
-    /// Algebraic least squares by SVD, coordinates as they are. False, and nothing written, below five pairs.
+    /// Algebraic least squares (direct linear transformation): the right singular vector of the smallest singular value of two
+    /// rows a pair, coordinates as they are, scaled so that H[2][2] is 1. False, and nothing written, below five pairs; true
+    /// otherwise, also where degenerate pairs give infinities or NaN.
     KEL_API bool estimate_byLSM(kelMatCorrespH& corresp);
-    /// Algebraic least squares on normalised coordinates. False, and nothing written, below five pairs.
+    /// estimate_byLSM() on normalised coordinates (Hartley, In defense of the eight-point algorithm, 1997), the one to use.
+    /// False, and nothing written, below five pairs.
     KEL_API bool estimate_byLSM_fine(kelMatCorrespH& corresp);
-    /// Taubin's method. False, and nothing written, below five pairs.
+    /// Taubin's method (Taubin, Estimation of planar curves, surfaces, and nonplanar space curves, 1991), coordinates as they
+    /// are: least squares weighted with the covariance that equal noise in all four coordinates gives. For noisy pairs:
+    /// with exact ones the factorised matrix is singular and rounding decides. Where degenerate pairs leave no solution the
+    /// estimator is filled with NaN. False, and nothing written, below five pairs; true otherwise.
     KEL_API bool estimate_byTaubin(kelMatCorrespH& corresp);
-    /// Robust fit by RANSAC and least squares on the inliers.
+    /// Robust fit by RANSAC (Fischler and Bolles, Random sample consensus, 1981): candidates through four random pairs, judged
+    /// by judgeHomography() and by the number of inliers, then least squares on the best one's inliers, repeated while they grow.
+    ///
+    /// At most 1500 candidates, fewer as the inliers allow for 99 % confidence, and none after the first with 50 inliers.
+    /// Draws from rand(): the same seed gives the same bits. The bounds of judgeHomography() are absolute: choose the units.
+    ///
+    /// @param corresp   the pairs; four or more for a search, five inliers for a result
+    /// @param threshold inlier distance, in the units of the second points
+    /// @param inliers   receives the final fit's number of inliers on success; may be null
+    /// @return false, with `*inliers` untouched and the matrix holding no result, below four pairs (the matrix untouched), with
+    ///         fewer than five inliers, or where a refit is not plausible. True is no proof: check number and share of the inliers.
     KEL_API bool estimate_byRANSAC_fine(kelMatCorrespH& corresp, float threshold, int* inliers);
 };
 
 /** Four indices drawn from 0 .. n-1 by rand(); c may equal a, any other two differ. n must be at least 4. */
 KEL_API void getRandomIndex(int& a, int& b, int& c, int& d, int n);
-/** Whether a homography is plausible: no mirror, moderate scale and perspective. NaN passes. */
+/**
+ * Whether a homography (3x3, not checked) is plausible: no mirror (H00 H11 - H10 H01 >= 0), lengths of its first two columns' upper parts
+ * between 0.1 and 4, length of (H20, H21) at most 0.002. Absolute bounds, for a homography scaled to H[2][2] = 1. NaN passes
+ * every test.
+ */
 KEL_API bool judgeHomography(kelMat& H);
-/** Counts the pairs whose transfer error in the second image is below threshold and marks them in mask (m_Num or more). */
+/**
+ * Counts the pairs whose transfer error in the second picture is below threshold (a pair at the threshold is none, nor is one whose
+ * error is NaN) and sets or clears their entries of `mask`, which must have m_Num of them or more. An empty set gives 0. Stops on
+ * "this->m_Width == 3 && this->m_Height == 3".
+ */
 KEL_API int judgeInliers(kelMat& H, kelMatCorrespH& corresp, std::vector<bool>& mask, float threshold);
 
 /** The 3x4 projection from object to image points of a set. The estimator is the matrix; zero after construction. */
@@ -336,13 +360,19 @@ class kelMatEstimatorP : public kelMat {
 public:
     KEL_API kelMatEstimatorP();
     KEL_API ~kelMatEstimatorP();
-    /// Algebraic least squares by SVD, coordinates as they are. False, and nothing written, below six pairs.
+    /// As kelMatEstimatorH::estimate_byLSM(), scaled so that P[2][3] is 1. False, and nothing written, below six pairs. The object
+    /// points must not lie in one plane.
     KEL_API bool estimate_byLSM(kelMatCorrespP& corresp);
-    /// Algebraic least squares on normalised coordinates. False, and nothing written, below six pairs.
+    /// estimate_byLSM() on normalised coordinates, the one to use. False, and nothing written, below six pairs.
     KEL_API bool estimate_byLSM_fine(kelMatCorrespP& corresp);
-    /// Taubin's method; prints its matrices to standard output. False, and nothing written, below six pairs.
+    /// Taubin's method with three rows a pair, coordinates as they are; see kelMatEstimatorH::estimate_byTaubin() for noise and
+    /// degenerate pairs. Prints the blocks "M", "N", "eigenvalue" and "result" with their matrices to standard output. Among the
+    /// eigenvalues the first counts as it is, later ones as magnitudes truncated to an integer. False, and nothing written
+    /// or printed, below six pairs.
     KEL_API bool estimate_byTaubin(kelMatCorrespP& corresp);
-    /// Robust fit by RANSAC and least squares on the inliers.
+    /// Robust fit by RANSAC, as kelMatEstimatorH::estimate_byRANSAC_fine() with samples of six, at most 1500 candidates and none
+    /// after the first with 400 inliers; no test of plausibility. False below six pairs (the matrix untouched) or with fewer than six
+    /// inliers.
     KEL_API bool estimate_byRANSAC_fine(kelMatCorrespP& corresp, float threshold);
 };
 
@@ -350,7 +380,7 @@ public:
 KEL_API void getRandomIndex(int n, int& a, int& b, int& c, int& d, int& e, int& f);
 /** Always true. */
 KEL_API bool judgeMatrixP(kelMat& P);
-/** Counts the pairs whose reprojection error is below threshold and marks them in mask (m_Num or more). */
+/** As the form for homographies, with the reprojection error. Stops on "this->m_Width == 4 && this->m_Height == 3". */
 KEL_API int judgeInliers(kelMat& P, kelMatCorrespP& corresp, std::vector<bool>& mask, float threshold);
 
 /**

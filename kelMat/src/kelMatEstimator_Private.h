@@ -17,7 +17,7 @@ namespace kel {
 // theta = the right singular vector of A's smallest singular value; of equal ones the first. A is left with nothing of use.
 template <int N> void smallestSingularVector(kelMat& A, float* theta) {
     kelMat W, V;
-    decompose(A.m_Data, A, false, W, V);
+    decomposeWithoutU(A, W, V);
     int k = 0;
     for (int i = 1; i < N; ++i)
         if (W[i][i] < W[k][k])

@@ -124,13 +124,14 @@ TEST(Converter, AgreesWithItsReferenceForEveryFillOnBothGuards) {
             }
 }
 
-// Called directly a converter takes the destination's width and height, whatever the source's are.
-TEST(Converter, FollowsTheDestinationsSizeWhereTheSourceIsLarger) {
+// Called directly a converter takes the destination's width and height, whatever the source's are; and no alignment of data.
+TEST(Converter, FollowsTheDestinationsSizeAtAnyAddress) {
     for (const Case& c : allCases())
-        for (int width : {1, 15, 20, 33}) {
-            const Image src(70, 9, c.from), dst(width, 4, c.to, Guard::Behind, room(c, width, 4));
-            ASSERT_TRUE(agrees(c.converter, c.reference, dst, src)) << c.name << ", width " << width;
-        }
+        for (int width : {1, 15, 20, 33, 70})
+            for (size_t odd : {0, 5}) {
+                const Image src(70, 9, c.from, Guard::Behind, odd), dst(width, 4, c.to, Guard::Behind, room(c, width, 4) + odd);
+                ASSERT_TRUE(agrees(c.converter, c.reference, dst, src)) << c.name << ", width " << width;
+            }
 }
 
 // Data areas that end with the last row's last pixel instead of its padding.

@@ -68,7 +68,7 @@ TEST(Contrast, AgreesWithItsReferenceAtEverySizeAndFill) {
                     expectAdjusted(adjust, dst, src);
                     expectAdjusted(adjust, src, src); // in place
                 }
-    const Image larger(70, 9, 0), dst(20, 4, 0);
+    const Image larger(70, 9, 0, Guard::Behind, 5), dst(20, 4, 0, Guard::Behind, 3); // at odd addresses, too
     expectAdjusted(adjustKelImageSSE_U8G, dst, larger);
 }
 
@@ -116,7 +116,8 @@ TEST(Threshold, AgreesWithItsReferenceAtEverySizeAndThreshold) {
                 expectBinary(binalize, dst, src, 100);
                 expectBinary(binalize, src, src, 100); // in place
             }
-    const Image all(256, 1, 0), dst(256, 1, 0), larger(70, 9, 0), smaller(20, 4, 0);
+    const Image all(256, 1, 0), dst(256, 1, 0);
+    const Image larger(70, 9, 0, Guard::Behind, 5), smaller(20, 4, 0, Guard::Behind, 3); // at odd addresses, too
     for (int i = 0; i < 256; ++i)
         all.data()[i] = static_cast<uint8_t>(i);
     for (int threshold = -300; threshold < 600; ++threshold)
@@ -157,7 +158,7 @@ TEST(AdaptiveThreshold, AgreesWithItsReferenceAtEverySize) {
 }
 
 TEST(AdaptiveThreshold, TakesScratchOfAnySize) {
-    const Image src(80, 60, 0), dst(80, 60, 0);
+    const Image src(80, 60, 0, Guard::Behind, 5), dst(80, 60, 0, Guard::Behind, 3); // at odd addresses, too
     for (int width : {20, 32, 33, 40, 65, 79, 80})
         for (int height : {20, 60})
             if (width > 64 || height == 60) {
