@@ -21,9 +21,9 @@ inline void store8(uint8_t* dst, __m128i value) {
     _mm_storel_epi64(reinterpret_cast<__m128i*>(dst), value);
 }
 
-// Calls body(d, s) for each whole block of N units, of D bytes in the destination and S bytes in the source, moves both pointers
-// behind the last of them, and returns the units left. Large images are bound by fetching the lines to be written, so these are
-// asked for ahead (harmless behind the end), each once in a group of blocks.
+// Calls body(d, s) for each whole block of N units, of D bytes in the destination and S bytes in the source, moves both
+// pointers behind the last of them, and returns the units left. Large images are bound by fetching the lines to be written, so
+// these are asked for ahead (harmless behind the end), each once in a group of blocks.
 template <int N, int D, int S, class Body>
 inline ptrdiff_t walkBlocks(uint8_t*& d, const uint8_t*& s, ptrdiff_t units, Body body) {
     constexpr int group = 4, line = 64, ahead = 24 * line;

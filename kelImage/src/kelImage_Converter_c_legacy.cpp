@@ -142,13 +142,13 @@ __m128i truncatedSum(const kel::YuvProducts& p, __m128 a) {
 
 // Stores eight pixels of three channels from the words of each, the first pixels of four pairs before the second ones.
 void store3(uint8_t* d, __m128i c0, __m128i c1, __m128i c2) {
-    const __m128i c01 = _mm_packus_epi16(c0, c1), c2_ = _mm_packus_epi16(c2, c2);
+    const __m128i c01 = _mm_packus_epi16(c0, c1), c22 = _mm_packus_epi16(c2, c2);
     const __m128i from01 = _mm_setr_epi8(0, 8, -1, 4, 12, -1, 1, 9, -1, 5, 13, -1, 2, 10, -1, 6);
     const __m128i from2 = _mm_setr_epi8(-1, -1, 0, -1, -1, 4, -1, -1, 1, -1, -1, 5, -1, -1, 2, -1);
     const __m128i end01 = _mm_setr_epi8(14, -1, 3, 11, -1, 7, 15, -1, -1, -1, -1, -1, -1, -1, -1, -1);
     const __m128i end2 = _mm_setr_epi8(-1, 6, -1, -1, 3, -1, -1, 7, -1, -1, -1, -1, -1, -1, -1, -1);
-    store16(d, _mm_or_si128(_mm_shuffle_epi8(c01, from01), _mm_shuffle_epi8(c2_, from2)));
-    store8(d + 16, _mm_or_si128(_mm_shuffle_epi8(c01, end01), _mm_shuffle_epi8(c2_, end2)));
+    store16(d, _mm_or_si128(_mm_shuffle_epi8(c01, from01), _mm_shuffle_epi8(c22, from2)));
+    store8(d + 16, _mm_or_si128(_mm_shuffle_epi8(c01, end01), _mm_shuffle_epi8(c22, end2)));
 }
 
 // Pairs of pixels; at odd widths the second pixel of the last pair lands in the padding.
