@@ -563,7 +563,8 @@ private:
             if (w[i] == 0.0f) {
                 U.fromRow(i, [&](float* tile, int, int) KEL_INLINE { fill4(tile + kLanes * i, 0.0f); });
                 U.at(i, i) += 1.0f;
-                dots(i - 1, i - 1, n, i);
+                if (i > 0)
+                    dots(i - 1, i - 1, n, i);
                 continue;
             }
             const float reciprocal = 1.0f / w[i], diagonal = U.at(i, i);
