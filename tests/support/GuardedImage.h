@@ -74,7 +74,8 @@ public:
         m_open = m_base + page;
         std::memset(m_open, kPattern, m_inner);
         m_image->data = guard == Guard::Behind ? m_open + m_inner - m_bytes : m_open;
-        fill(Fill::Random, static_cast<uint32_t>(width * 7919 + height * 131 + type));
+        fill(Fill::Random,
+             static_cast<uint32_t>(width) * 7919 + static_cast<uint32_t>(height) * 131 + static_cast<uint32_t>(type));
     }
     ~Image() {
         munmap(m_base, m_mapped);
