@@ -218,31 +218,55 @@ KEL_API int KEL_RAND_NORMAL(int x);
  * ---------------------------------------------------------------------------------------------------------------- */
 
 /**
- * Converts `src` into `dst` of equal width and height by the pair of their types.
+ * Converts `src` into `dst` of equal width and height by the pair of their types, with the converter of that name:
  *
- * | from \ to | U8G        | S16G        | U8XYZ, U8ZYX     | U8XYZA, U8ZYXA                        | U8YUV |
- * |-----------|------------|-------------|------------------|---------------------------------------|-------|
- * | U8G       | copy       | U8G_to_S16G | U8G_to_U8XYZ     | U8G_to_U8XYZA                         | -     |
- * | S16G      | S16G_to_U8G| copy        | S16G_to_U8XYZ    | S16G_to_U8XYZA                        | -     |
- * | 3 channels| mean       | mean        | same: copy; opposite: reversed | order KEPT, also to the opposite layout | - |
- * | 4 channels| mean, MISPLACED | mean, MISPLACED | same order: kept; opposite: reversed | same: copy; opposite: reversed | - |
- * | U8YUV     | luma       | -           | truncated        | rounded                               | copy  |
+ * | from \ to  | U8G           | S16G           | U8XYZ           | U8XYZA           | U8ZYX           | U8ZYXA           |
+ * |------------|---------------|----------------|-----------------|------------------|-----------------|------------------|
+ * | U8G        | copy          | U8G_to_S16G    | U8G_to_U8XYZ    | U8G_to_U8XYZA    | U8G_to_U8XYZ    | U8G_to_U8XYZA    |
+ * | S16G       | S16G_to_U8G   | copy           | S16G_to_U8XYZ   | S16G_to_U8XYZA   | S16G_to_U8XYZ   | S16G_to_U8XYZA   |
+ * | U8XYZ      | U8XYZ_to_U8G  | U8XYZ_to_S16G  | copy            | U8XYZ_to_U8XYZA  | U8XYZ_to_U8ZYX  | U8XYZ_to_U8XYZA  |
+ * | U8XYZA     | U8XYZA_to_U8G | U8XYZA_to_S16G | U8XYZA_to_U8XYZ | copy             | U8XYZA_to_U8ZYX | U8XYZA_to_U8ZYXA |
+ * | U8ZYX      | U8XYZ_to_U8G  | U8XYZ_to_S16G  | U8XYZ_to_U8ZYX  | U8XYZ_to_U8XYZA  | copy            | U8XYZ_to_U8XYZA  |
+ * | U8ZYXA     | U8XYZA_to_U8G | U8XYZA_to_S16G | U8XYZA_to_U8ZYX | U8XYZA_to_U8ZYXA | U8XYZA_to_U8XYZ | copy             |
+ * | U8YUV      | U8YUV_to_U8G  | -              | U8YUV_to_U8BGR  | U8YUV_to_U8BGRA  | U8YUV_to_U8RGB  | U8YUV_to_U8RGBA  |
  *
- * Two routes need care, and callers rely on both:
- *  - Three channels to four channels of the opposite order (U8XYZ to U8ZYXA, U8ZYX to U8XYZA) keep the channel order.
- *  - FOUR CHANNELS TO GREY WRITE PAST AN ORDINARY DESTINATION: pixel (x, y) lands at element 3 * (y * step + x), so the
- *    destination's data area needs 3 * step * height elements. The safe way from four channels to grey goes through a
- *    three-channel image.
+ * "copy" copies src->size bytes, padding included, and so does U8YUV to U8YUV. The pair marked "-" and any pair that is not
+ * listed do nothing.
  *
- * "copy" copies src->size bytes, padding included. A pair marked "-" and any other type does nothing.
+ * @warning FOUR CHANNELS TO GREY WRITE FAR PAST AN ORDINARY DESTINATION. From U8XYZA or U8ZYXA to U8G or S16G pixel (x, y)
+ * lands at element 3 * (y * step + x), where a three-channel image would have it; what lies between is left alone. The
+ * destination's data area must hold 3 * step * height elements, three times its `size`. The safe way: convert to U8XYZ (or
+ * U8ZYX) first and that to grey.
+ *
+ * @warning Three channels to four channels of the opposite order (U8XYZ to U8ZYXA, U8ZYX to U8XYZA) KEEP the channel order in
+ * memory. To reverse it on the way call convertKelImage_U8XYZ_to_U8ZYXA(). All other pairs of opposite order reverse it.
+ *
+ * U8YUV to four channels drifts against the rows unless width % 16 is 0, 13, 14 or 15; see the vector converters.
+ *
  * Stops the process on "dst->width == src->width && dst->height == src->height".
  */
 KEL_API void convertKelImage(kelImage_t* dst, const kelImage_t* src);
 
 /**
  * @name Portable converters
- * One per route. None checks anything; each iterates the destination's width and height with both images' steps and
- * touches no padding, the YUV ones excepted.
+ * For each pixel (x, y) of the destination's width and height, rows by either image's own step; s0 .. s3 and d0 .. d3 are the
+ * channels in memory order, s a grey source. Nothing is checked: neither types nor sizes. Padding is neither read nor written,
+ * YUV and grey sources excepted (below). Where source and destination pixels have equally many channels both may be the same
+ * memory.
+ *
+ *  - S16G_to_U8G, S16G_to_U8XYZ, S16G_to_U8XYZA: d0 (= d1 = d2) = low 8 bits of abs(s) >> 7: the magnitude by 1/128,
+ *    truncated; 32767 gives 255, 127 gives 0, and -32768 gives 0. d3 = 0.
+ *  - U8XYZ_to_U8G, U8XYZ_to_S16G: d = (s0 + s1 + s2) / 3, rounded down: the unweighted mean, 0 .. 255 in 16 bits as well (so
+ *    the way U8G, S16G, U8G divides by 128).
+ *  - U8XYZA_to_U8G, U8XYZA_to_S16G: the same mean, alpha ignored, written to element 3 * (y * step + x). The destination needs
+ *    3 * step * height elements: see the warning at convertKelImage().
+ *  - U8XYZ_to_U8XYZA: (s0, s1, s2, 0). U8XYZA_to_U8XYZ: (s0, s1, s2).
+ *  - U8XYZ_to_U8ZYX, U8XYZA_to_U8ZYX: (s2, s1, s0). U8XYZA_to_U8ZYXA: (s2, s1, s0, s3), the one converter that keeps alpha.
+ *  - U8YUV_to_U8RGB writes R, G, B, U8YUV_to_U8BGR writes B, G, R. In single precision, each product and each sum rounded by
+ *    the thread's rounding mode, with C = (Y - 16) * 1.164f, U' = U - 128, V' = V - 128:
+ *    R = C + 1.793f * V', G = (C + -0.213f * U') + -0.534f * V', B = C + 2.115f * U'; then limited to 0 .. 255 and truncated.
+ *    Pixels come in pairs U, Y0, V, Y1. At odd widths the last pair still writes both pixels, the second into the padding.
+ *  - The other six forward to the vector converter of the same name, and write the padding as it does.
  * @{
  */
 KEL_API void convertKelImage_S16G_to_U8G(kelImage_t* dst, const kelImage_t* src);
@@ -269,8 +293,23 @@ KEL_API void convertKelImage_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src)
 
 /**
  * @name Vector converters
- * Blocks of 16 pixels (4 for YUV to four channels) over the destination's width and height, in one continuous run through
- * both data areas; `step` is not read and nothing is checked.
+ * One continuous run through both data areas, of height times the destination's width rounded up to whole blocks; `step` is not
+ * read and nothing is checked. Data need no alignment.
+ *
+ * In blocks of 16 pixels, so that each row covers exactly its padded step, and the padding is converted, too:
+ *  - U8G_to_U8XYZ: (s, s, s). U8G_to_U8XYZA: (s, s, s, 0). U8G_to_S16G: s as it is, 0 .. 255.
+ *  - U8YUV_to_U8G: the luma byte of each pixel as it is, chroma ignored.
+ *
+ * In blocks of 4 pixels (8 bytes of the source, 16 of the destination):
+ *  - U8YUV_to_U8RGBA writes R, G, B, 0, U8YUV_to_U8BGRA writes B, G, R, 0. As the portable form, with two differences:
+ *    G = C + (-0.213f * U' + -0.534f * V'), and the sums are rounded to integers by the thread's rounding mode (to nearest,
+ *    ties to even, unless it was changed), then limited to 0 .. 255. So a channel can differ by one from the three-channel form.
+ *
+ * @warning Rows of these two follow each other without a gap, width rounded up to 4 pixels apart, in the source and in the
+ * destination. That is the images' own layout only where width % 16 is 0, 13, 14 or 15; at any other width row y is taken
+ * from and put to pixel y * (width rounded up to 4) of the data areas.
+ *
+ * U8YUV_to_U8BGR and U8YUV_to_U8RGB do nothing; the portable ones of these names do the work.
  * @{
  */
 KEL_API void convertKelImageSSE_U8G_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
@@ -287,8 +326,8 @@ KEL_API void convertKelImageSSE_U8YUV_to_U8RGB(kelImage_t* dst, const kelImage_t
 }
 #endif
 /**
- * Reverses the channels and adds alpha 0. No route of convertKelImage() comes here. Its symbol carries the parameter
- * types, for C callers too.
+ * Reverses the channels and adds alpha: (s2, s1, s0, 0), as the portable converters do it. No route of convertKelImage() comes
+ * here. Its symbol carries the parameter types, for C callers too.
  */
 #ifdef __cplusplus
 KEL_API void convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src);
@@ -305,20 +344,63 @@ extern "C" {
  * Contrast and binarization
  * ---------------------------------------------------------------------------------------------------------------- */
 
-/** Linear contrast stretch of a U8G image to 0..255. */
+/**
+ * @name Contrast stretching
+ * Spreads the values of a U8G image linearly over 0 .. 255. With the least and the greatest value of the source:
+ * d = (s - least) * (255 / (greatest - least)), in single precision, rounded by the thread's rounding mode (to nearest, ties to
+ * even, unless it was changed). Where all values are equal d = 0.
+ *
+ * PADDING TAKES PART: the range is that of whole rows of `step` pixels, and they are written as a whole. Clear or fill the
+ * source's padding, or what it holds widens the range: 100 .. 200 with zeros in the padding is stretched as 0 .. 200.
+ *
+ * adjustKelImage() checks and leaves images of other types than U8G alone; it calls adjustKelImage_U8G(), which calls
+ * adjustKelImageSSE_U8G(), and these two check nothing. `dst` and `src` may be the same image.
+ * @{
+ */
+/** Stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height == src->height". */
 KEL_API void adjustKelImage(kelImage_t* dst, const kelImage_t* src);
 KEL_API void adjustKelImage_U8G(kelImage_t* dst, const kelImage_t* src);
 KEL_API void adjustKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src);
+/** @} */
 
-/** Fixed threshold on a U8G image. */
+/**
+ * @name Fixed threshold
+ * d = 255 where s >= t, else 0, on U8G images; t is the low 8 bits of `threshold`, so 256 acts as 0 and -1 as 255. Whole rows
+ * of `step` pixels are written, padding included.
+ *
+ * binalizeKelImage() checks and leaves images of other types alone; the two it calls check nothing. `dst` and `src` may be the
+ * same image.
+ * @{
+ */
+/** Stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height == src->height". */
 KEL_API void binalizeKelImage(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
 KEL_API void binalizeKelImage_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
 KEL_API void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
+/** @} */
 
-/** Threshold against the local mean on a U8G image. */
+/**
+ * @name Adaptive threshold
+ * d = 255 where s >= m, else 0, on U8G images; m is the mean about the pixel by the kernel (2, 7, 14, 18, 14, 7, 2) / 64 at
+ * offsets -12, -8, -4, 0, 4, 8, 12, first along rows from `src` into `tmp`, then down the columns of `tmp`, truncated each time
+ * (sum >> 6). A pixel equal to its mean becomes 255.
+ *
+ * `tmp` is a U8G image of the same size for scratch, other than `src`; it is not checked, and for other types than U8G not even
+ * looked at (it may be null there). Its contents afterwards mean nothing.
+ *
+ * Written are rows 16 .. height-17 and the columns from 16 on, in blocks of 16 as long as a block starts before width - 16.
+ * EVERYTHING ELSE KEEPS WHAT `dst` HELD: clear it first where that matters. The means along rows come in blocks of 8, followed
+ * by zeros: where width % 16 is 1 .. 8 the last 8 columns written are compared with means of 0 and turn 255. Images of a width
+ * or height up to 32 leave `dst` unchanged (and of a width up to 32 `tmp`, too).
+ *
+ * binalizeKelImageAdaptive() checks and leaves images of other types alone; the two it calls check nothing. `dst` and `src` may
+ * be the same image.
+ * @{
+ */
+/** Stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height == src->height". */
 KEL_API void binalizeKelImageAdaptive(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
 KEL_API void binalizeKelImageAdaptive_U8G(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
 KEL_API void binalizeKelImageAdaptiveSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
+/** @} */
 
 /* ------------------------------------------------------------------------------------------------------------------
  * Filters

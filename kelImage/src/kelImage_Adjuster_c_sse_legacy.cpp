@@ -1,15 +1,12 @@
 // Contrast stretching of 8-bit grey, 16 pixels at a time over whole padded rows. Rests on SSE4.1.
-#include <smmintrin.h>
-
+#include "kelImage_Blocks.h"
 #include "kelImage_Private.h"
 
+using kel::load16;
 using kel::row;
+using kel::store16;
 
 namespace {
-
-__m128i load(const uint8_t* p) {
-    return _mm_loadu_si128(reinterpret_cast<const __m128i*>(p));
-}
 
 int leastByte(__m128i v) {
     v = _mm_min_epu8(v, _mm_srli_si128(v, 8));
@@ -30,7 +27,7 @@ Range rangeOf(const kelImage_t* src, const kelImage_t* dst) {
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         const uint8_t* const s = row<uint8_t>(src, y);
         for (kelValue_s32 x = 0; x < dst->width; x += 16) {
-            const __m128i v = load(s + x);
+            const __m128i v = load16(s + x);
             least = _mm_min_epu8(least, v);
             greatest = _mm_max_epu8(greatest, v);
         }
@@ -62,12 +59,9 @@ void adjustKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src) {
     const int extent = range.greatest - range.least;
     const __m128 scale = _mm_set1_ps(extent ? 255.0f / static_cast<float>(extent) : 1.0f);
     const __m128i least = _mm_set1_epi8(static_cast<char>(range.least));
-    for (kelValue_s32 y = 0; y < dst->height; ++y) {
-        uint8_t* const d = row<uint8_t>(dst, y);
-        const uint8_t* const s = row<uint8_t>(src, y);
-        for (kelValue_s32 x = 0; x < dst->width; x += 16)
-            _mm_storeu_si128(reinterpret_cast<__m128i*>(d + x), stretched(load(s + x), least, scale));
-    }
+    for (kelValue_s32 y = 0; y < dst->height; ++y)
+        kel::walkRow(row<uint8_t>(dst, y), row<uint8_t>(src, y), dst->width,
+                     [=](uint8_t* d, const uint8_t* s) { store16(d, stretched(load16(s), least, scale)); });
 }
 
 } // extern "C"

@@ -1,22 +1,16 @@
 // Binarization of 8-bit grey, 16 pixels at a time: against one threshold, and against a local mean. Rests on SSE4.1.
 #include <algorithm>
-#include <smmintrin.h>
 
+#include "kelImage_Blocks.h"
 #include "kelImage_Private.h"
 
+using kel::load16;
+using kel::load8;
 using kel::row;
+using kel::store16;
+using kel::store8;
 
 namespace {
-
-__m128i load(const uint8_t* p) {
-    return _mm_loadu_si128(reinterpret_cast<const __m128i*>(p));
-}
-__m128i loadHalf(const uint8_t* p) {
-    return _mm_loadl_epi64(reinterpret_cast<const __m128i*>(p));
-}
-void store(uint8_t* p, __m128i v) {
-    _mm_storeu_si128(reinterpret_cast<__m128i*>(p), v);
-}
 
 // 255 where s >= t as unsigned bytes, else 0.
 __m128i atLeast(__m128i s, __m128i t) {
@@ -36,16 +30,16 @@ __m128i weighted(__m128i outer, __m128i middle, __m128i inner, __m128i centre) {
 
 // Means of 8 pixels at `p`, taps `pitch` bytes apart, in words; reads 8 bytes at each tap.
 __m128i means8(const uint8_t* p, ptrdiff_t pitch) {
-    const auto both = [=](ptrdiff_t tap) { return _mm_unpacklo_epi8(loadHalf(p - tap * pitch), loadHalf(p + tap * pitch)); };
-    return weighted(both(3), both(2), both(1), _mm_unpacklo_epi8(loadHalf(p), _mm_setzero_si128()));
+    const auto both = [=](ptrdiff_t tap) { return _mm_unpacklo_epi8(load8(p - tap * pitch), load8(p + tap * pitch)); };
+    return weighted(both(3), both(2), both(1), _mm_unpacklo_epi8(load8(p), _mm_setzero_si128()));
 }
 
 // The same for 16 pixels, in bytes; reads 16 bytes at each tap.
 __m128i means16(const uint8_t* p, ptrdiff_t pitch) {
-    const __m128i zero = _mm_setzero_si128(), centre = load(p);
-    const __m128i outer0 = load(p - 3 * pitch), outer1 = load(p + 3 * pitch);
-    const __m128i middle0 = load(p - 2 * pitch), middle1 = load(p + 2 * pitch);
-    const __m128i inner0 = load(p - pitch), inner1 = load(p + pitch);
+    const __m128i zero = _mm_setzero_si128(), centre = load16(p);
+    const __m128i outer0 = load16(p - 3 * pitch), outer1 = load16(p + 3 * pitch);
+    const __m128i middle0 = load16(p - 2 * pitch), middle1 = load16(p + 2 * pitch);
+    const __m128i inner0 = load16(p - pitch), inner1 = load16(p + pitch);
     const __m128i low = weighted(_mm_unpacklo_epi8(outer0, outer1), _mm_unpacklo_epi8(middle0, middle1),
                                  _mm_unpacklo_epi8(inner0, inner1), _mm_unpacklo_epi8(centre, zero));
     const __m128i high = weighted(_mm_unpackhi_epi8(outer0, outer1), _mm_unpackhi_epi8(middle0, middle1),
@@ -59,11 +53,11 @@ __m128i means16(const uint8_t* p, ptrdiff_t pitch) {
 void meansAlongRow(uint8_t* t, const uint8_t* s, kelValue_s32 width) {
     kelValue_s32 x = kMargin;
     for (; x + 8 < width - kMargin; x += 16)
-        store(t + x, means16(s + x, kDistance));
+        store16(t + x, means16(s + x, kDistance));
     if (x < width - kMargin) {
-        store(t + x, _mm_packus_epi16(means8(s + x, kDistance), _mm_setzero_si128()));
+        store16(t + x, _mm_packus_epi16(means8(s + x, kDistance), _mm_setzero_si128()));
     } else {
-        _mm_storel_epi64(reinterpret_cast<__m128i*>(t + x), _mm_setzero_si128());
+        store8(t + x, _mm_setzero_si128());
     }
 }
 
@@ -72,7 +66,7 @@ void compareRow(kelImage_t* dst, const kelImage_t* src, const kelImage_t* tmp, k
     uint8_t* const d = row<uint8_t>(dst, y);
     const uint8_t *const s = row<uint8_t>(src, y), *const t = row<uint8_t>(tmp, y);
     for (kelValue_s32 x = kMargin; x < dst->width - kMargin; x += 16)
-        store(d + x, atLeast(load(s + x), means16(t + x, kDistance * tmp->step)));
+        store16(d + x, atLeast(load16(s + x), means16(t + x, kDistance * tmp->step)));
 }
 
 } // namespace
@@ -81,12 +75,9 @@ extern "C" {
 
 void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold) {
     const __m128i t = _mm_set1_epi8(static_cast<char>(threshold)); // the low 8 bits only: callers rely on 256 being 0
-    for (kelValue_s32 y = 0; y < dst->height; ++y) {
-        uint8_t* const d = row<uint8_t>(dst, y);
-        const uint8_t* const s = row<uint8_t>(src, y);
-        for (kelValue_s32 x = 0; x < dst->width; x += 16)
-            store(d + x, atLeast(load(s + x), t));
-    }
+    for (kelValue_s32 y = 0; y < dst->height; ++y)
+        kel::walkRow(row<uint8_t>(dst, y), row<uint8_t>(src, y), dst->width,
+                     [t](uint8_t* d, const uint8_t* s) { store16(d, atLeast(load16(s), t)); });
 }
 
 // Both passes row by row: the destination's row y follows as soon as the means of row y + 12 are there, while they are cached.

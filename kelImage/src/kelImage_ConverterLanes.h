@@ -1,25 +1,11 @@
 // Vector building blocks that the portable and the vector converters share: grey spread over channels, and the products of YUV
-// to colour, up to where the two forms part. Rests on SSE4.1 alone.
+// to colour, up to where the two forms part.
 #ifndef KEL_IMAGE_CONVERTER_LANES_H
 #define KEL_IMAGE_CONVERTER_LANES_H
 
-#include <smmintrin.h>
-#include <stdint.h>
+#include "kelImage_Blocks.h"
 
 namespace kel {
-
-inline __m128i load16(const uint8_t* src) {
-    return _mm_loadu_si128(reinterpret_cast<const __m128i*>(src));
-}
-inline __m128i load8(const uint8_t* src) {
-    return _mm_loadl_epi64(reinterpret_cast<const __m128i*>(src));
-}
-inline void store16(uint8_t* dst, __m128i value) {
-    _mm_storeu_si128(reinterpret_cast<__m128i*>(dst), value);
-}
-inline void store8(uint8_t* dst, __m128i value) {
-    _mm_storel_epi64(reinterpret_cast<__m128i*>(dst), value);
-}
 
 // Writes 16 grey values as 16 pixels of N channels, the fourth being 0. Index -1 of a shuffle gives 0.
 template <int N> inline void storeGrey(uint8_t* dst, __m128i grey) {
@@ -52,14 +38,15 @@ struct YuvProducts {
 
 // `pairs` holds U, Y0, V, Y1 four times.
 inline YuvProducts yuvProducts(__m128i pairs) {
-    const __m128i lowWord = _mm_set1_epi32(1); // pmaddwd with it leaves the lower word of each lane, with its sign
-    const __m128i y = _mm_sub_epi16(_mm_srli_epi16(pairs, 8), _mm_set1_epi16(16));
-    const __m128i uv = _mm_sub_epi16(_mm_and_si128(pairs, _mm_set1_epi16(0xff)), _mm_set1_epi16(128));
-    const __m128 u = _mm_cvtepi32_ps(_mm_madd_epi16(uv, lowWord));
-    const __m128 v = _mm_cvtepi32_ps(_mm_srai_epi32(uv, 16));
+    const auto lanes = [pairs](int byte, int bias) { // one byte of each pair, less the bias
+        const int select = byte | ~0xff;             // zero bytes above it
+        const __m128i bytes = _mm_shuffle_epi8(pairs, _mm_setr_epi32(select, select + 4, select + 8, select + 12));
+        return _mm_cvtepi32_ps(_mm_sub_epi32(bytes, _mm_set1_epi32(bias)));
+    };
+    const __m128 u = lanes(0, 128), v = lanes(2, 128);
     YuvProducts p;
-    p.C[0] = _mm_mul_ps(_mm_cvtepi32_ps(_mm_madd_epi16(y, lowWord)), _mm_set1_ps(kLuma));
-    p.C[1] = _mm_mul_ps(_mm_cvtepi32_ps(_mm_srai_epi32(y, 16)), _mm_set1_ps(kLuma));
+    p.C[0] = _mm_mul_ps(lanes(1, 16), _mm_set1_ps(kLuma));
+    p.C[1] = _mm_mul_ps(lanes(3, 16), _mm_set1_ps(kLuma));
     p.redV = _mm_mul_ps(v, _mm_set1_ps(kRedV));
     p.greenU = _mm_mul_ps(u, _mm_set1_ps(kGreenU));
     p.greenV = _mm_mul_ps(v, _mm_set1_ps(kGreenV));

@@ -12,26 +12,15 @@ using kel::store8;
 
 namespace {
 
-// One pixel at a time: body(d, s) with D elements of T and S bytes for each pixel of the destination.
-template <class T, int D, int S, class Body> void forEachPixel(kelImage_t* dst, const kelImage_t* src, Body body) {
-    for (kelValue_s32 y = 0; y < dst->height; ++y) {
-        T* d = row<T>(dst, y, D);
-        const uint8_t* s = row<uint8_t>(src, y, S);
-        for (kelValue_s32 x = 0; x < dst->width; ++x, d += D, s += S)
-            body(d, s);
-    }
-}
-
-// Whole blocks: body(d, s) turns N units of S bytes into as many of D bytes. What is left of a row goes through a buffer, so
-// that nothing beside the row's own units is read or written.
+// A row in blocks; body(d, s) turns N units of S bytes into as many of D bytes. What is left of the row goes through a buffer,
+// so that nothing beside the row's own units is read or written.
 template <int N, int D, int S, class Body> void alongRow(uint8_t* d, const uint8_t* s, kelValue_s32 units, Body body) {
-    for (; units >= N; units -= N, d += N * D, s += N * S)
-        body(d, s);
-    if (units > 0) {
+    const ptrdiff_t rest = kel::walkBlocks<N, D, S>(d, s, units, body);
+    if (rest > 0) {
         uint8_t in[N * S] = {}, out[N * D];
-        memcpy(in, s, static_cast<size_t>(units) * S);
+        memcpy(in, s, static_cast<size_t>(rest) * S);
         body(out, in);
-        memcpy(d, out, static_cast<size_t>(units) * D);
+        memcpy(d, out, static_cast<size_t>(rest) * D);
     }
 }
 
@@ -51,49 +40,93 @@ template <int Channels> void magnitudeTo(kelImage_t* dst, const kelImage_t* src)
     forEachBlock<16, Channels, 2>(dst, src, [](uint8_t* d, const uint8_t* s) { kel::storeGrey<Channels>(d, magnitude16(s)); });
 }
 
-// Sums of the four pixels of three bytes that start at byte `first` of a vector.
-template <int first> __m128i sums4(__m128i v) {
-    const __m128i ones = _mm_set1_epi16(1), byteOnes = _mm_set1_epi8(1);
-    const __m128i start = _mm_setr_epi8(0, 1, 2, -1, 3, 4, 5, -1, 6, 7, 8, -1, 9, 10, 11, -1);
-    const __m128i shifted = _mm_setr_epi8(4, 5, 6, -1, 7, 8, 9, -1, 10, 11, 12, -1, 13, 14, 15, -1);
-    return _mm_madd_epi16(_mm_maddubs_epi16(_mm_shuffle_epi8(v, first ? shifted : start), byteOnes), ones);
+// Sums of the first three bytes of four pixels of S bytes; the first of them starts at byte `first` of the vector.
+template <int S, int first> __m128i sums4(__m128i v) {
+    constexpr int a = first, b = a + S, c = b + S, d = c + S;
+    const __m128i threes = _mm_setr_epi8(a, a + 1, a + 2, -1, b, b + 1, b + 2, -1, c, c + 1, c + 2, -1, d, d + 1, d + 2, -1);
+    return _mm_madd_epi16(_mm_maddubs_epi16(_mm_shuffle_epi8(v, threes), _mm_set1_epi8(1)), _mm_set1_epi16(1));
 }
 
-// Words (s0 + s1 + s2) / 3 of eight pixels of three bytes. A sum is at most 765; there sum * 21846 >> 16 is sum / 3.
-__m128i means8(const uint8_t* s) {
-    const __m128i sums = _mm_packs_epi32(sums4<0>(load16(s)), sums4<4>(load16(s + 8)));
+// Words (s0 + s1 + s2) / 3 of eight pixels of S bytes. A sum is at most 765; there sum * 21846 >> 16 is sum / 3.
+template <int S> __m128i means8(const uint8_t* s) {
+    constexpr int second = 8 * S - 16; // of the last vector within the pixels' bytes: nothing behind them is read
+    const __m128i sums = _mm_packs_epi32(sums4<S, 0>(load16(s)), sums4<S, 4 * S - second>(load16(s + second)));
     return _mm_mulhi_epu16(sums, _mm_set1_epi16(21846));
 }
 
-int mean(const uint8_t* s) {
-    return (s[0] + s[1] + s[2]) / 3;
+// Four channels to grey: pixel (x, y) lands at element 3 * (y * step + x), where a three-channel destination would have it,
+// and what lies between is left alone. Callers rely on it.
+template <class T> void misplacedMeans(kelImage_t* dst, const kelImage_t* src) {
+    for (kelValue_s32 y = 0; y < dst->height; ++y) {
+        T* const d = row<T>(dst, y, 3);
+        const uint8_t* const s = row<uint8_t>(src, y, 4);
+        ptrdiff_t x = 0;
+        for (; x + 8 <= dst->width; x += 8) {
+            uint16_t means[8];
+            _mm_storeu_si128(reinterpret_cast<__m128i*>(means), means8<4>(s + 4 * x));
+            for (int i = 0; i < 8; ++i)
+                d[3 * (x + i)] = static_cast<T>(means[i]);
+        }
+        for (; x < dst->width; ++x)
+            d[3 * x] = static_cast<T>((s[4 * x] + s[4 * x + 1] + s[4 * x + 2]) / 3);
+    }
 }
 
 // Which source channel each destination channel takes; -1 gives 0.
 using Order = int[4];
 constexpr Order kKeep = {0, 1, 2, -1}, kReverse = {2, 1, 0, -1}, kReverseWithAlpha = {2, 1, 0, 3};
 
-// Pixels of S bytes into pixels of D bytes, with as many pixels a step as 16 bytes hold. The bytes that a step stores beyond
-// them belong to the row's next pixels: the next step writes those, and what lies in place there is kept until then.
-template <int D, int S> void reorder(kelImage_t* dst, const kelImage_t* src, const Order& order) {
-    constexpr int pixels = 16 / (D > S ? D : S), least = D < S ? D : S;
+// The shuffle of a vector that starts at byte `srcStart` of pixels of S bytes into one that starts at byte `dstStart` of pixels
+// of D bytes. Bytes that come from outside the source vector are 0.
+template <int D, int S> __m128i shuffleOf(const Order& order, int dstStart, int srcStart) {
     uint8_t index[16];
-    for (int i = 0; i < 16; ++i)
-        index[i] = static_cast<uint8_t>(i / D >= pixels ? i : order[i % D] < 0 ? -1 : i / D * S + order[i % D]);
-    const __m128i shuffle = load16(index);
-    for (kelValue_s32 y = 0; y < dst->height; ++y) {
-        uint8_t* d = row<uint8_t>(dst, y, D);
-        const uint8_t* s = row<uint8_t>(src, y, S);
-        ptrdiff_t rest = dst->width;
-        for (; rest * least >= 16; rest -= pixels, d += pixels * D, s += pixels * S)
-            store16(d, _mm_shuffle_epi8(load16(s), shuffle));
-        for (; rest > 0; --rest, d += D, s += S) {
-            uint8_t pixel[S];
-            memcpy(pixel, s, S);
-            for (int c = 0; c < D; ++c)
-                d[c] = order[c] < 0 ? 0 : pixel[order[c]];
-        }
+    for (int i = 0; i < 16; ++i) {
+        const int byte = dstStart + i, pixel = byte < 0 ? -1 : byte / D, channel = byte - pixel * D;
+        const int from = pixel < 0 || order[channel] < 0 ? -1 : pixel * S + order[channel] - srcStart;
+        index[i] = static_cast<uint8_t>(from < 0 || from > 15 ? -1 : from);
     }
+    return load16(index);
+}
+
+void threeToThree(kelImage_t* dst, const kelImage_t* src, const Order& order) {
+    const auto shuffle = [&order](int to, int from) { return shuffleOf<3, 3>(order, 16 * to, 16 * from); };
+    const __m128i m00 = shuffle(0, 0), m01 = shuffle(0, 1), m10 = shuffle(1, 0), m11 = shuffle(1, 1), m12 = shuffle(1, 2),
+                  m21 = shuffle(2, 1), m22 = shuffle(2, 2);
+    forEachBlock<16, 3, 3>(dst, src, [=](uint8_t* d, const uint8_t* s) {
+        const __m128i s0 = load16(s), s1 = load16(s + 16), s2 = load16(s + 32);
+        store16(d, _mm_or_si128(_mm_shuffle_epi8(s0, m00), _mm_shuffle_epi8(s1, m01)));
+        store16(d + 16,
+                _mm_or_si128(_mm_or_si128(_mm_shuffle_epi8(s0, m10), _mm_shuffle_epi8(s2, m12)), _mm_shuffle_epi8(s1, m11)));
+        store16(d + 32, _mm_or_si128(_mm_shuffle_epi8(s1, m21), _mm_shuffle_epi8(s2, m22)));
+    });
+}
+
+void threeToFour(kelImage_t* dst, const kelImage_t* src, const Order& order) {
+    const __m128i low = shuffleOf<4, 3>(order, 0, 0), high = shuffleOf<4, 3>(order, 48, 32);
+    forEachBlock<16, 4, 3>(dst, src, [=](uint8_t* d, const uint8_t* s) {
+        const __m128i s0 = load16(s), s1 = load16(s + 16), s2 = load16(s + 32);
+        store16(d, _mm_shuffle_epi8(s0, low));
+        store16(d + 16, _mm_shuffle_epi8(_mm_alignr_epi8(s1, s0, 12), low));
+        store16(d + 32, _mm_shuffle_epi8(_mm_alignr_epi8(s2, s1, 8), low));
+        store16(d + 48, _mm_shuffle_epi8(s2, high));
+    });
+}
+
+void fourToThree(kelImage_t* dst, const kelImage_t* src, const Order& order) {
+    const __m128i low = shuffleOf<3, 4>(order, 0, 0), high = shuffleOf<3, 4>(order, -4, 0); // 12 bytes at either end
+    forEachBlock<16, 3, 4>(dst, src, [=](uint8_t* d, const uint8_t* s) {
+        const __m128 q1 = _mm_castsi128_ps(_mm_shuffle_epi8(load16(s + 16), low));
+        const __m128 q2 = _mm_castsi128_ps(_mm_shuffle_epi8(load16(s + 32), high));
+        const __m128i q0 = _mm_shuffle_epi8(load16(s), high), q3 = _mm_shuffle_epi8(load16(s + 48), low);
+        store16(d, _mm_alignr_epi8(_mm_castps_si128(q1), q0, 4));
+        store16(d + 16, _mm_castps_si128(_mm_shuffle_ps(q1, q2, _MM_SHUFFLE(2, 1, 2, 1))));
+        store16(d + 32, _mm_alignr_epi8(q3, _mm_castps_si128(q2), 12));
+    });
+}
+
+void fourToFour(kelImage_t* dst, const kelImage_t* src, const Order& order) {
+    const __m128i shuffle = shuffleOf<4, 4>(order, 0, 0);
+    forEachBlock<4, 4, 4>(dst, src, [=](uint8_t* d, const uint8_t* s) { store16(d, _mm_shuffle_epi8(load16(s), shuffle)); });
 }
 
 // C + a + b of the eight pixels of four pairs, truncated.
@@ -109,13 +142,13 @@ __m128i truncatedSum(const kel::YuvProducts& p, __m128 a) {
 
 // Stores eight pixels of three channels from the words of each, the first pixels of four pairs before the second ones.
 void store3(uint8_t* d, __m128i c0, __m128i c1, __m128i c2) {
-    const __m128i c01 = _mm_packus_epi16(c0, c1), c2_ = _mm_packus_epi16(c2, c2);
+    const __m128i c01 = _mm_packus_epi16(c0, c1), c22 = _mm_packus_epi16(c2, c2);
     const __m128i from01 = _mm_setr_epi8(0, 8, -1, 4, 12, -1, 1, 9, -1, 5, 13, -1, 2, 10, -1, 6);
     const __m128i from2 = _mm_setr_epi8(-1, -1, 0, -1, -1, 4, -1, -1, 1, -1, -1, 5, -1, -1, 2, -1);
     const __m128i end01 = _mm_setr_epi8(14, -1, 3, 11, -1, 7, 15, -1, -1, -1, -1, -1, -1, -1, -1, -1);
     const __m128i end2 = _mm_setr_epi8(-1, 6, -1, -1, 3, -1, -1, 7, -1, -1, -1, -1, -1, -1, -1, -1);
-    store16(d, _mm_or_si128(_mm_shuffle_epi8(c01, from01), _mm_shuffle_epi8(c2_, from2)));
-    store8(d + 16, _mm_or_si128(_mm_shuffle_epi8(c01, end01), _mm_shuffle_epi8(c2_, end2)));
+    store16(d, _mm_or_si128(_mm_shuffle_epi8(c01, from01), _mm_shuffle_epi8(c22, from2)));
+    store8(d + 16, _mm_or_si128(_mm_shuffle_epi8(c01, end01), _mm_shuffle_epi8(c22, end2)));
 }
 
 // Pairs of pixels; at odd widths the second pixel of the last pair lands in the padding.
@@ -206,41 +239,39 @@ void convertKelImage_S16G_to_U8XYZA(kelImage_t* dst, const kelImage_t* src) {
 
 void convertKelImage_U8XYZ_to_U8G(kelImage_t* dst, const kelImage_t* src) {
     forEachBlock<16, 1, 3>(dst, src,
-                           [](uint8_t* d, const uint8_t* s) { store16(d, _mm_packus_epi16(means8(s), means8(s + 24))); });
+                           [](uint8_t* d, const uint8_t* s) { store16(d, _mm_packus_epi16(means8<3>(s), means8<3>(s + 24))); });
 }
 
 void convertKelImage_U8XYZ_to_S16G(kelImage_t* dst, const kelImage_t* src) {
-    forEachBlock<8, 2, 3>(dst, src, [](uint8_t* d, const uint8_t* s) { store16(d, means8(s)); });
+    forEachBlock<8, 2, 3>(dst, src, [](uint8_t* d, const uint8_t* s) { store16(d, means8<3>(s)); });
 }
 
 void convertKelImage_U8XYZ_to_U8ZYX(kelImage_t* dst, const kelImage_t* src) {
-    reorder<3, 3>(dst, src, kReverse);
+    threeToThree(dst, src, kReverse);
 }
 
 void convertKelImage_U8XYZ_to_U8XYZA(kelImage_t* dst, const kelImage_t* src) {
-    reorder<4, 3>(dst, src, kKeep);
+    threeToFour(dst, src, kKeep);
 }
 
-// Four channels to grey: pixel (x, y) lands at element 3 * (y * step + x), where a three-channel destination would have it,
-// and what lies between is left alone. Callers rely on it.
 void convertKelImage_U8XYZA_to_U8G(kelImage_t* dst, const kelImage_t* src) {
-    forEachPixel<uint8_t, 3, 4>(dst, src, [](uint8_t* d, const uint8_t* s) { *d = static_cast<uint8_t>(mean(s)); });
+    misplacedMeans<uint8_t>(dst, src);
 }
 
 void convertKelImage_U8XYZA_to_S16G(kelImage_t* dst, const kelImage_t* src) {
-    forEachPixel<int16_t, 3, 4>(dst, src, [](int16_t* d, const uint8_t* s) { *d = static_cast<int16_t>(mean(s)); });
+    misplacedMeans<int16_t>(dst, src);
 }
 
 void convertKelImage_U8XYZA_to_U8XYZ(kelImage_t* dst, const kelImage_t* src) {
-    reorder<3, 4>(dst, src, kKeep);
+    fourToThree(dst, src, kKeep);
 }
 
 void convertKelImage_U8XYZA_to_U8ZYX(kelImage_t* dst, const kelImage_t* src) {
-    reorder<3, 4>(dst, src, kReverse);
+    fourToThree(dst, src, kReverse);
 }
 
 void convertKelImage_U8XYZA_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src) {
-    reorder<4, 4>(dst, src, kReverseWithAlpha);
+    fourToFour(dst, src, kReverseWithAlpha);
 }
 
 void convertKelImage_U8YUV_to_U8RGB(kelImage_t* dst, const kelImage_t* src) {
@@ -278,5 +309,5 @@ void convertKelImage_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src) {
 } // extern "C"
 
 void convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src) {
-    reorder<4, 3>(dst, src, kReverse);
+    threeToFour(dst, src, kReverse);
 }

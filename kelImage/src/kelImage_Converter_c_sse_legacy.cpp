@@ -22,8 +22,7 @@ ptrdiff_t pixelsOfRun(const kelImage_t* dst, ptrdiff_t block) {
 template <int D, int S, class Body> void walk16(kelImage_t* dst, const kelImage_t* src, Body body) {
     uint8_t* d = dst->data;
     const uint8_t* s = src->data;
-    for (ptrdiff_t rest = pixelsOfRun(dst, 16); rest > 0; rest -= 16, d += 16 * D, s += 16 * S)
-        body(d, s);
+    kel::walkBlocks<16, D, S>(d, s, pixelsOfRun(dst, 16), body);
 }
 
 // Bytes of eight pixels from the words of their channels, the first pixels of four pairs before the second ones.
@@ -54,12 +53,11 @@ FourChannels8 colour(__m128i pairs, bool blueFirst) {
 template <bool blueFirst> void yuvToFourChannels(kelImage_t* dst, const kelImage_t* src) {
     uint8_t* d = dst->data;
     const uint8_t* s = src->data;
-    ptrdiff_t rest = pixelsOfRun(dst, 4);
-    for (; rest >= 8; rest -= 8, d += 32, s += 16) {
-        const FourChannels8 pixels = colour(load16(s), blueFirst);
-        store16(d, pixels.low);
-        store16(d + 16, pixels.high);
-    }
+    const ptrdiff_t rest = kel::walkBlocks<8, 4, 2>(d, s, pixelsOfRun(dst, 4), [](uint8_t* to, const uint8_t* from) {
+        const FourChannels8 pixels = colour(load16(from), blueFirst);
+        store16(to, pixels.low);
+        store16(to + 16, pixels.high);
+    });
     if (rest > 0)
         store16(d, colour(load8(s), blueFirst).low);
 }

@@ -1,6 +1,7 @@
 // The numerical kernels behind the matrix class: LU, Cholesky, singular values, symmetric eigenvalues, and the products they
 // need. Every element's own sum runs in the order that the textbook algorithms have, whatever the loops around it look like.
 #include <algorithm>
+#include <float.h>
 #include <math.h>
 #include <smmintrin.h>
 
@@ -239,24 +240,69 @@ bool vanishes(float g, float x) {
     return magnitude + static_cast<double>(g) == magnitude;
 }
 
-// The rotation g - s (h + g tau), h + s (g - h tau) of two rows, `count` a multiple of four.
-void rotateRows(float* x, float* y, ptrdiff_t count, float s, float tau) {
-    const __m128 S = _mm_set1_ps(s), Tau = _mm_set1_ps(tau);
+struct JacobiRotation {
+    float t, s, tau; // tangent, sine, tangent of half the angle
+    bool small;      // the cosine is 1
+    float theta;     // magnitude of the cotangent of the double angle
+};
+
+// What takes `element` to zero, h the difference of its diagonal elements and g a multiple of its magnitude.
+KEL_INLINE inline JacobiRotation jacobiRotation(float element, float h, float g) {
+    constexpr float kLargeTheta = 8192.0f;       // beyond it 1 + theta^2 is theta^2
+    constexpr float kSmallTangent = 1.0f / 4096; // below it 1 + t^2 is 1
+    JacobiRotation r;
+    const float theta = 0.5f * h / element;
+    r.theta = std::min(fabsf(theta), FLT_MAX);
+    if (vanishes(g, h)) {
+        r.t = element / h;
+    } else {
+        const float root = r.theta > kLargeTheta ? r.theta : sqrtf(1.0f + theta * theta), t = 1.0f / (r.theta + root);
+        r.t = copysignf(t, theta + 0.0f); // + 0 for its sign: a theta of -0 turns as +0 does
+    }
+    r.small = fabsf(r.t) < kSmallTangent;
+    if (r.small) {
+        r.s = r.t;
+        r.tau = 0.5f * r.s;
+    } else {
+        const float c = static_cast<float>(1.0 / sqrt(static_cast<double>(r.t * r.t + 1.0f)));
+        r.s = r.t * c;
+        r.tau = r.s / (1.0f + c);
+    }
+    return r;
+}
+
+__m128 magnitude(__m128 v) {
+    return _mm_andnot_ps(_mm_set1_ps(-0.0f), v);
+}
+
+// g - s (h + g tau) and h + s (g - h tau) for two rows, `count` a multiple of four.
+KEL_INLINE inline void rotateRows(float* x, float* y, ptrdiff_t count, const JacobiRotation& r) {
+    const __m128 s = _mm_set1_ps(r.s), tau = _mm_set1_ps(r.tau);
     for (ptrdiff_t i = 0; i < count; i += kLanes) {
         const __m128 g = _mm_load_ps(x + i), h = _mm_load_ps(y + i);
-        _mm_store_ps(x + i, _mm_sub_ps(g, _mm_mul_ps(S, _mm_add_ps(h, _mm_mul_ps(g, Tau)))));
-        _mm_store_ps(y + i, _mm_add_ps(h, _mm_mul_ps(S, _mm_sub_ps(g, _mm_mul_ps(h, Tau)))));
+        _mm_store_ps(x + i, _mm_sub_ps(g, _mm_mul_ps(s, _mm_add_ps(h, _mm_mul_ps(g, tau)))));
+        _mm_store_ps(y + i, _mm_add_ps(h, _mm_mul_ps(s, _mm_sub_ps(g, _mm_mul_ps(h, tau)))));
     }
 }
 
-// The tangent of the angle that takes `element` to zero, h the difference of its diagonal elements.
-float rotationTangent(float element, float h, float g) {
-    if (vanishes(g, h))
-        return element / h;
-    const float theta = 0.5f * h / element;
-    const float t = 1.0f / (fabsf(theta) + sqrtf(1.0f + theta * theta));
-    const __m128 negative = _mm_cmplt_ss(_mm_set_ss(theta), _mm_setzero_ps()); // no branch: signs are unpredictable
-    return _mm_cvtss_f32(_mm_xor_ps(_mm_set_ss(t), _mm_and_ps(negative, _mm_set_ss(-0.0f))));
+// The same, with the same results, for a small rotation. Its products often are subnormal, which costs the processor dearly;
+// where such a product is added to a number it cannot change, a factor of zero takes its place.
+KEL_INLINE inline void rotateRowsLittle(float* x, float* y, ptrdiff_t count, const JacobiRotation& r) {
+    const __m128 s = _mm_set1_ps(r.s), tau = _mm_set1_ps(r.tau);
+    const __m128 leastForS = _mm_set1_ps(0x1p-124f * r.theta);   // from here on a product with s is a normal number,
+    const __m128 leastForTau = _mm_set1_ps(0x1p-123f * r.theta); // with tau; s is 1 / (2 theta), tau half of it
+    const __m128 firm = _mm_set1_ps(0x1p-99f);                   // changed by no product below that
+    const auto unless = [](__m128 less, __m128 least, __m128 isFirm, __m128 v) {
+        return _mm_andnot_ps(_mm_and_ps(_mm_cmplt_ps(less, least), isFirm), v);
+    };
+    for (ptrdiff_t i = 0; i < count; i += kLanes) {
+        const __m128 g = _mm_load_ps(x + i), h = _mm_load_ps(y + i), sizeG = magnitude(g), sizeH = magnitude(h);
+        const __m128 firmG = _mm_cmpge_ps(sizeG, firm), firmH = _mm_cmpge_ps(sizeH, firm);
+        const __m128 a = _mm_add_ps(h, _mm_mul_ps(unless(sizeG, leastForTau, firmH, g), tau));
+        const __m128 b = _mm_sub_ps(g, _mm_mul_ps(unless(sizeH, leastForTau, firmG, h), tau));
+        _mm_store_ps(x + i, _mm_sub_ps(g, _mm_mul_ps(s, unless(magnitude(a), leastForS, firmG, a))));
+        _mm_store_ps(y + i, _mm_add_ps(h, _mm_mul_ps(s, unless(magnitude(b), leastForS, firmH, b))));
+    }
 }
 
 // The iteration on a symmetric matrix. Rows are kept whole, mirrored over the diagonal, and eigenvectors as rows, all padded to
@@ -321,6 +367,13 @@ private:
         return sum;
     }
 
+    KEL_INLINE void rotate(float* x, float* y, const JacobiRotation& r) const {
+        if (r.small)
+            rotateRowsLittle(x, y, m_pitch, r);
+        else
+            rotateRows(x, y, m_pitch, r);
+    }
+
     // Takes element (p, q) to zero; whether that was by a rotation.
     bool visit(int p, int q, bool shortcut, float threshold) {
         float *const P = row(p), *const Q = row(q);
@@ -331,21 +384,20 @@ private:
         }
         if (!(fabsf(element) > threshold))
             return false;
-        const float t = rotationTangent(element, d[q] - d[p], g);
-        const float c = static_cast<float>(1.0 / sqrt(static_cast<double>(t * t + 1.0f)));
-        const float s = t * c, tau = s / (1.0f + c), h = t * element;
+        const JacobiRotation r = jacobiRotation(element, d[q] - d[p], g);
+        const float h = r.t * element;
         z[p] -= h;
         z[q] += h;
         d[p] -= h;
         d[q] += h;
-        rotateRows(P, Q, m_pitch, s, tau);
+        rotate(P, Q, r);
         P[q] = Q[p] = 0.0f;
         float* mirror = m_rows.data();
         for (int j = 0; j < n; ++j, mirror += m_pitch) {
             mirror[p] = P[j];
             mirror[q] = Q[j];
         }
-        rotateRows(vector(p), vector(q), m_pitch, s, tau);
+        rotate(vector(p), vector(q), r);
         return true;
     }
 };

@@ -2,12 +2,9 @@
 // through the operations of the textbook loops in their order; only what runs side by side is arranged for vectors.
 #include <algorithm>
 #include <smmintrin.h>
-#include <string.h>
 #include <type_traits>
 
 #include "kelMat_Private.h"
-
-#define KEL_INLINE __attribute__((always_inline))
 
 namespace {
 
@@ -34,7 +31,7 @@ struct Rotation {
     float c, s;
 };
 
-// Rotates N tiles, `tileFloats` apart. The second column of a rotation stays in registers, as it mostly is the first of the next.
+// Rotates N tiles, `tileFloats` apart. The second column of a rotation, mostly the first of the next, stays in registers.
 template <int N> void rotate(float* tiles, ptrdiff_t tileFloats, const Rotation* begin, const Rotation* end) {
     if (begin == end)
         return;
@@ -79,8 +76,6 @@ public:
         : m_rows(M.m_Height), m_columns(M.m_Width), m_full(M.m_Height / kLanes), m_floats(ptrdiff_t(kLanes) * M.m_Width),
           m_data(M.m_Data), m_last(m_floats), m_spare(m_floats) {}
 
-    int rows() const { return m_rows; }
-    int columns() const { return m_columns; }
     ptrdiff_t floats() const { return m_floats; }
     int count() const { return (m_rows + kLanes - 1) / kLanes; }
     float* operator[](int tile) { return tile < m_full ? m_data + m_floats * tile : m_last.data(); }
@@ -281,7 +276,7 @@ private:
 class Svd {
 public:
     Svd(kelMat& u, bool withU, kelMat& v)
-        : m(u.m_Height), n(u.m_Width), m_withU(withU), U(u), V(v), v(v), m_space(spaceFor(n)) {
+        : m(u.m_Height), n(u.m_Width), m_withU(withU), U(u), V(v), m_v(v.m_Data), m_space(spaceFor(n)) {
         float* next = m_space.data();
         const auto take = [&](ptrdiff_t floats) {
             next += floats;
@@ -300,7 +295,7 @@ public:
         U.pack(a);
         bidiagonalize();
         accumulateRight();
-        V.pack(v.m_Data);
+        V.pack(m_v);
         if (m_withU)
             accumulateLeft();
         bool converged = true;
@@ -310,7 +305,7 @@ public:
         if (m_withU)
             finishU();
         for (int i = 0; i < n; ++i)
-            wOut[i][i] = w[i];
+            wOut.m_Data[static_cast<ptrdiff_t>(i) * n + i] = w[i];
         return converged;
     }
 
@@ -321,7 +316,7 @@ private:
     const int m, n;
     const bool m_withU;
     Tiles U, V;
-    kelMat& v;                        // V before it is packed
+    float* const m_v;                 // V in rows, before it is packed
     float *m_factor, *m_row, *m_step; // a number per column, each four times
     float* m_sums;                    // a number per column
     float *w, *e;                     // diagonal and superdiagonal
@@ -406,7 +401,8 @@ private:
             for (int t = 0; t < N; ++t) {
                 if (Column)
                     _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], scales));
-                next = addLanes(next, magnitude(_mm_load_ps(A + apart * t)), from, to);
+                if (count > 0)
+                    next = addLanes(next, magnitude(_mm_load_ps(A + apart * t)), from, to);
             }
         });
         return next;
@@ -423,38 +419,43 @@ private:
         float scale = columnScale(0), super = 0.0f;
         for (int i = 0; i < n; ++i) {
             e[i] = super;
-            w[i] = 0.0f;
-            super = 0.0f;
-            if (i < m) {
-                const bool column = scale != 0.0f;
-                const float columnScale = scale;
-                float head = 0.0f;
-                if (column) {
-                    const float squares = normalizeColumn(i, scale);
-                    float& first = U.at(i, i);
-                    const Reflection reflection(first, squares);
-                    head = first = first - reflection.g;
-                    dots(i, i, n, i);
-                    for (int j = i + 1; j < n; ++j) {
-                        const float factor = m_sums[j] / reflection.h;
-                        fill4(m_factor + kLanes * j, factor);
-                        U.at(i, j) += factor * head;
-                    }
-                    w[i] = scale * reflection.g;
-                }
-                const bool row = takeRow(i, super);
-                if (i + 1 < n)
-                    scale = column ? row ? reflect<true, true>(i, scale) : reflect<true, false>(i, scale)
-                            : row ? reflect<false, true>(i, scale)
-                                   : reflect<false, false>(i, scale);
-                else if (column)
-                    scaleColumn(i, scale);
-                if (column)
-                    U.at(i, i) = head * columnScale;
-            }
+            w[i] = super = 0.0f;
+            if (i < m)
+                scale = reduce(i, scale, super);
             const float size = std::fabs(w[i]) + std::fabs(e[i]);
             m_norm = m_norm > size ? m_norm : size;
         }
+    }
+
+    // Column i, with `scale` the sum of its magnitudes, and row i. Sets w[i] and the superdiagonal element `super`; returns the
+    // scale of the next column.
+    float reduce(int i, float scale, float& super) {
+        const bool column = scale != 0.0f;
+        const float head = column ? takeColumn(i, scale) : 0.0f;
+        const bool row = takeRow(i, super);
+        if (!column)
+            return row ? reflect<false, true>(i, scale) : reflect<false, false>(i, scale);
+        const float next = row ? reflect<true, true>(i, scale) : reflect<true, false>(i, scale);
+        U.at(i, i) = head * scale;
+        return next;
+    }
+
+    // Makes column i a Householder vector, and ready in m_factor what it takes from the columns right of it, in row i already
+    // taken. Sets w[i]; returns the first element of the vector.
+    float takeColumn(int i, float scale) {
+        const float squares = normalizeColumn(i, scale);
+        float& first = U.at(i, i);
+        const Reflection reflection(first, squares);
+        const float head = first - reflection.g;
+        first = head;
+        dots(i, i, n, i);
+        for (int j = i + 1; j < n; ++j) {
+            const float factor = m_sums[j] / reflection.h;
+            fill4(m_factor + kLanes * j, factor);
+            U.at(i, j) += factor * head;
+        }
+        w[i] = scale * reflection.g;
+        return head;
     }
 
     // Row i right of the diagonal moves to m_rows as a Householder vector, ready for the rows below in m_row and m_step, and
@@ -484,30 +485,25 @@ private:
         return true;
     }
 
-    void scaleColumn(int i, float scale) {
-        const __m128 scales = _mm_set1_ps(scale);
-        U.fromRow(i, [&](float* tile, int, int)
-                         KEL_INLINE { _mm_store_ps(tile + kLanes * i, _mm_mul_ps(_mm_load_ps(tile + kLanes * i), scales)); });
-    }
-
     // ---- the transformations multiplied out
 
     void accumulateRight() {
+        const auto row = [this](int i) { return m_v + static_cast<ptrdiff_t>(i) * n; };
         for (int i = n - 1; i >= 0; --i) {
             const int l = i + 1;
-            const float* const row = m_rows + static_cast<ptrdiff_t>(i) * n;
+            const float* const reflected = m_rows + static_cast<ptrdiff_t>(i) * n;
             if (l < n && e[l] != 0.0f) {
                 for (int j = l; j < n; ++j)
-                    v[j][i] = row[j] / row[l] / e[l]; // two divisions: the product of the divisors could underflow
+                    row(j)[i] = reflected[j] / reflected[l] / e[l]; // two divisions: the product could underflow
                 std::fill(m_sums + l, m_sums + n, 0.0f);
                 for (int k = l; k < n; ++k)
-                    addMultiple(m_sums, row[k], v[k], l);
+                    addMultiple(m_sums, reflected[k], row(k), l);
                 for (int k = l; k < n; ++k)
-                    addMultiple(v[k], v[k][i], m_sums, l);
+                    addMultiple(row(k), row(k)[i], m_sums, l);
             }
             for (int j = l; j < n; ++j)
-                v[i][j] = v[j][i] = 0.0f;
-            v[i][i] = 1.0f;
+                row(i)[j] = row(j)[i] = 0.0f;
+            row(i)[i] = 1.0f;
         }
     }
 

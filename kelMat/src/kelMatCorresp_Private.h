@@ -13,7 +13,7 @@ namespace kel {
 // Throws the sequence's out-of-range error where it holds fewer than n values.
 inline void requireValues(const std::vector<float>& values, int n) {
     if (n > 0 && values.size() < static_cast<size_t>(n))
-        values.at(values.size());
+        (void)values.at(values.size());
 }
 
 // The sum of distances so far, rounded back to single precision after every step; the root and the addition are in double.

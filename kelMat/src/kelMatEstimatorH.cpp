@@ -18,7 +18,7 @@ void fillRows(float* row, float x1, float y1, float x2, float y2) {
 }
 
 // The least-squares solution of design rows, scaled so that H[2][2] is 1.
-void solve(kelMat& H, const kelMat& A) {
+void solve(kelMat& H, kelMat& A) {
     kel::smallestSingularVector<kUnknowns>(A, H.m_Data);
     H.setDataUnitize();
 }

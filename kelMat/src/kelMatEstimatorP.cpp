@@ -23,7 +23,7 @@ void fillRows(float* row, const kelMatCorrespP& corresp, int i) {
 }
 
 // The least-squares solution of design rows, scaled so that P[2][3] is 1.
-void solve(kelMat& P, const kelMat& A) {
+void solve(kelMat& P, kelMat& A) {
     kel::smallestSingularVector<kUnknowns>(A, P.m_Data);
     P.setDataUnitize();
 }

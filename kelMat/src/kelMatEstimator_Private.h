@@ -14,10 +14,10 @@
 
 namespace kel {
 
-// theta = the right singular vector of A's smallest singular value; of equal ones the first.
-template <int N> void smallestSingularVector(const kelMat& A, float* theta) {
-    kelMat U, W, V;
-    A.getDecomposedMatrix_SV(U, W, V);
+// theta = the right singular vector of A's smallest singular value; of equal ones the first. A is left with nothing of use.
+template <int N> void smallestSingularVector(kelMat& A, float* theta) {
+    kelMat W, V;
+    decomposeWithoutU(A, W, V);
     int k = 0;
     for (int i = 1; i < N; ++i)
         if (W[i][i] < W[k][k])
@@ -26,7 +26,7 @@ template <int N> void smallestSingularVector(const kelMat& A, float* theta) {
         theta[i] = V[i][k];
 }
 
-// Aᵀ A of a design matrix that is given row by row and never formed: every element sums over the rows in their order.
+// A^T A of a design matrix that is given row by row and never formed: every element sums over the rows in their order.
 template <int N> class Moments {
 public:
     Moments() { std::fill_n(m_sum[0], N * kPadded, 0.0f); }

@@ -10,6 +10,8 @@
 
 #include "kelMat.h"
 
+#define KEL_INLINE __attribute__((always_inline))
+
 namespace kel {
 
 // n elements of a plain type, indeterminate at first: inside the object up to N, from malloc beyond.
@@ -95,9 +97,14 @@ void multiply(float* R, const float* A, const float* B, int rows, int inner, int
 void transpose(float* T, const float* A, int rows, int columns);
 
 // Singular value decomposition of a, which has the size of u and is u.m_Data itself or apart from it. Creates w and v, n x n.
-// With `withU` u becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs less than
+// With `withU` u becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs about
 // half, and w and v have the same bits. False where a value does not converge.
 bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v);
+
+// The w and v of nr_svdcmp(), bit for bit, where a is not needed any more.
+inline bool decomposeWithoutU(kelMat& a, kelMat& w, kelMat& v) {
+    return decompose(a.m_Data, a, false, w, v);
+}
 
 } // namespace kel
 

@@ -9,11 +9,14 @@
 #include "ConverterReference.h"
 #include "GuardedImage.h"
 #include "Stops.h"
+#include "Sweep.h"
 
 using kel_test::Bytes;
 using kel_test::Fill;
 using kel_test::Guard;
 using kel_test::Image;
+using kel_test::kRoundingModes;
+using kel_test::widths;
 
 namespace {
 
@@ -73,7 +76,7 @@ Bytes expectedOf(Converter reference, const Image& dst, const Image& src) {
     return expected;
 }
 
-// What differs, or empty.
+// Runs the converter beside its reference: both areas must hold what they should, margins included.
 testing::AssertionResult agrees(Converter converter, Converter reference, const Image& dst, const Image& src) {
     const Bytes expected = expectedOf(reference, dst, src), source = src.bytes();
     converter(dst.get(), src.get());
@@ -87,18 +90,6 @@ size_t room(const Case& c, int width, int height) {
     const size_t bytes = static_cast<size_t>(dst->size) * (c.room - 1);
     releaseKelImageHeader(&dst);
     return bytes;
-}
-
-const std::pair<const char*, int> kRoundingModes[] = {
-    {"nearest", FE_TONEAREST}, {"down", FE_DOWNWARD}, {"up", FE_UPWARD}, {"zero", FE_TOWARDZERO}};
-
-std::vector<int> widths() {
-    std::vector<int> all = {-3, 0};
-    for (int width = 1; width <= 70; ++width)
-        all.push_back(width);
-    for (int width : {95, 96, 97, 127, 128, 129, 200})
-        all.push_back(width);
-    return all;
 }
 
 } // namespace
@@ -124,13 +115,16 @@ TEST(Converter, AgreesWithItsReferenceForEveryFillOnBothGuards) {
             }
 }
 
-// Called directly a converter takes the destination's width and height, whatever the source's are.
-TEST(Converter, FollowsTheDestinationsSizeWhereTheSourceIsLarger) {
+// Called directly a converter takes the destination's width and height, whatever the source's are; and data need no more
+// alignment than their elements.
+TEST(Converter, FollowsTheDestinationsSizeWhateverTheAlignment) {
     for (const Case& c : allCases())
-        for (int width : {1, 15, 20, 33}) {
-            const Image src(70, 9, c.from), dst(width, 4, c.to, Guard::Behind, room(c, width, 4));
-            ASSERT_TRUE(agrees(c.converter, c.reference, dst, src)) << c.name << ", width " << width;
-        }
+        for (int width : {1, 15, 20, 33, 70})
+            for (size_t spare : {0, 6}) {
+                const Image src(70, 9, c.from, Guard::Behind, spare),
+                    dst(width, 4, c.to, Guard::Behind, room(c, width, 4) + spare);
+                ASSERT_TRUE(agrees(c.converter, c.reference, dst, src)) << c.name << ", width " << width;
+            }
 }
 
 // Data areas that end with the last row's last pixel instead of its padding.
@@ -147,6 +141,18 @@ TEST(Converter, PortableOnesNeedNoPaddingBehindTheLastPixel) {
                     continue; // the destination is three times as large and has no such end
                 const auto src = image(c.from, bytesOf(c.from)), dst = image(c.to, bytesOf(c.to));
                 ASSERT_TRUE(agrees(c.converter, c.reference, *dst, *src)) << c.name << ", width " << width;
+            }
+}
+
+// Areas that end with the run of 4-pixel blocks, which is shorter than the rows by step: a block takes 8 bytes, not more.
+TEST(Converter, ColourBlocksStayInsideTheirRun) {
+    for (const Case& c : {Case{KEL_SSE_CASE(U8YUV_to_U8RGBA, 40, 32)}, Case{KEL_SSE_CASE(U8YUV_to_U8BGRA, 40, 16)}})
+        for (int width = 1; width < 40; ++width)
+            for (int height = 1; height < 4; ++height) {
+                const int missing = ((width + 15) / 16 * 16 - (width + 3) / 4 * 4) * height; // pixels
+                const Image src(width, height, c.from, Guard::Behind, size_t(0) - 2 * missing);
+                const Image dst(width, height, c.to, Guard::Behind, size_t(0) - 4 * missing);
+                ASSERT_TRUE(agrees(c.converter, c.reference, dst, src)) << c.name << ", width " << width;
             }
 }
 
@@ -229,11 +235,11 @@ TEST(Converter, YuvFollowsTheThreadsRoundingMode) {
         for (const Case& c : kPadded)
             if (c.from == 40) {
                 const Image dst(1024, 16, c.to);
-                std::fesetround(mode.second);
+                std::fesetround(mode.mode);
                 const Bytes expected = expectedOf(c.reference, dst, src);
                 c.converter(dst.get(), src.get());
                 std::fesetround(FE_TONEAREST);
-                EXPECT_TRUE(holds(dst, expected)) << c.name << ", rounding " << mode.first;
+                EXPECT_TRUE(holds(dst, expected)) << c.name << ", rounding " << mode.name;
             }
 }
 

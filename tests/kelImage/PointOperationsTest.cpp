@@ -9,22 +9,16 @@
 #include "GuardedImage.h"
 #include "PointReference.h"
 #include "Stops.h"
+#include "Sweep.h"
 
 using kel_test::Bytes;
 using kel_test::Fill;
 using kel_test::Guard;
 using kel_test::Image;
+using kel_test::kRoundingModes;
+using kel_test::widths;
 
 namespace {
-
-std::vector<int> widths() {
-    std::vector<int> all = {-3, 0};
-    for (int width = 1; width <= 70; ++width)
-        all.push_back(width);
-    for (int width : {95, 96, 97, 127, 128, 129, 200})
-        all.push_back(width);
-    return all;
-}
 
 // Bytes that reference() leaves in an image, which itself stays as it is.
 template <class Reference> Bytes expectedOf(const Image& image, Reference reference) {
@@ -34,9 +28,6 @@ template <class Reference> Bytes expectedOf(const Image& image, Reference refere
     image.set(before);
     return expected;
 }
-
-const std::pair<const char*, int> kRoundingModes[] = {
-    {"nearest", FE_TONEAREST}, {"down", FE_DOWNWARD}, {"up", FE_UPWARD}, {"zero", FE_TOWARDZERO}};
 
 using Operation = void (*)(kelImage_t*, const kelImage_t*);
 const Operation kAdjust[] = {adjustKelImage, adjustKelImage_U8G, adjustKelImageSSE_U8G};
@@ -68,7 +59,7 @@ TEST(Contrast, AgreesWithItsReferenceAtEverySizeAndFill) {
                     expectAdjusted(adjust, dst, src);
                     expectAdjusted(adjust, src, src); // in place
                 }
-    const Image larger(70, 9, 0), dst(20, 4, 0);
+    const Image larger(70, 9, 0, Guard::Behind, 5), dst(20, 4, 0, Guard::Behind, 3); // at odd addresses, too
     expectAdjusted(adjustKelImageSSE_U8G, dst, larger);
 }
 
@@ -80,11 +71,11 @@ TEST(Contrast, StretchesEveryRange) {
             for (int least : {0, (255 - extent) / 2, 255 - extent}) {
                 for (int i = 0; i < 256; ++i)
                     src.data()[i] = static_cast<uint8_t>(least + i % (extent + 1));
-                std::fesetround(mode.second);
+                std::fesetround(mode.mode);
                 const Bytes expected = expectedOf(dst, [&] { kel_ref::adjust(dst.get(), src.get()); });
                 adjustKelImage(dst.get(), src.get());
                 std::fesetround(FE_TONEAREST);
-                ASSERT_TRUE(holds(dst, expected)) << least << " to " << least + extent << ", rounding " << mode.first;
+                ASSERT_TRUE(holds(dst, expected)) << least << " to " << least + extent << ", rounding " << mode.name;
             }
 }
 
@@ -116,7 +107,8 @@ TEST(Threshold, AgreesWithItsReferenceAtEverySizeAndThreshold) {
                 expectBinary(binalize, dst, src, 100);
                 expectBinary(binalize, src, src, 100); // in place
             }
-    const Image all(256, 1, 0), dst(256, 1, 0), larger(70, 9, 0), smaller(20, 4, 0);
+    const Image all(256, 1, 0), dst(256, 1, 0);
+    const Image larger(70, 9, 0, Guard::Behind, 5), smaller(20, 4, 0, Guard::Behind, 3); // at odd addresses, too
     for (int i = 0; i < 256; ++i)
         all.data()[i] = static_cast<uint8_t>(i);
     for (int threshold = -300; threshold < 600; ++threshold)
@@ -157,7 +149,7 @@ TEST(AdaptiveThreshold, AgreesWithItsReferenceAtEverySize) {
 }
 
 TEST(AdaptiveThreshold, TakesScratchOfAnySize) {
-    const Image src(80, 60, 0), dst(80, 60, 0);
+    const Image src(80, 60, 0, Guard::Behind, 5), dst(80, 60, 0, Guard::Behind, 3); // at odd addresses, too
     for (int width : {20, 32, 33, 40, 65, 79, 80})
         for (int height : {20, 60})
             if (width > 64 || height == 60) {

@@ -1,6 +1,7 @@
 // Correspondence sets, homography and projection estimators against plain references, bit for bit, and against the truth.
 #include <cmath>
 #include <cstring>
+#include <fstream>
 #include <functional>
 #include <limits>
 
@@ -504,4 +505,47 @@ TEST(Generator, DrawsItsValuesInArgumentOrder) {
     random.getMat(P);
     fixed.getMat(expected);
     EXPECT_TRUE(sameBits(P, expected));
+}
+
+// Real tentative matches, where a folder of them is named at configure time.
+TEST(Ransac, HoldsOnMatchesOfPhotographs) {
+    const std::string folder = std::string(KEL_DATA_DIR) + "/points/";
+    if (!std::ifstream(folder + "graf_pts.txt"))
+        GTEST_SKIP() << "KEL_DATA_DIR names no folder with points";
+    const struct {
+        const char* name;
+        int least; // successes of 200 seeds
+        bool plausibleBackwards;
+    } sets[] = {{"graf", 200, true},     {"WhiteBoard", 198, true}, {"LePoint1", 200, true},
+                {"Brussels", 200, true}, {"adam", 200, false},      {"CapitalRegion", 195, true}};
+    for (const auto& set : sets) {
+        kelMatCorrespH matches, validation;
+        std::ifstream in(folder + set.name + "_pts.txt");
+        float x1, y1, w1, x2, y2, w2;
+        for (int label; in >> x1 >> y1 >> w1 >> x2 >> y2 >> w2 >> label;)
+            (label ? validation : matches).add(x1, y1, x2, y2);
+        int successes = 0;
+        for (unsigned seed = 1; seed <= 200; ++seed) {
+            srand(seed);
+            kelMatEstimatorH H;
+            if (!H.estimate_byRANSAC_fine(matches, 3, nullptr))
+                continue;
+            float sum = 0;
+            for (int i = 0; i < validation.m_Num; ++i) {
+                float u, v;
+                H.cvtPoint(validation.m_SrcX[i], validation.m_SrcY[i], &u, &v);
+                sum += std::hypot(u - validation.m_DstX[i], v - validation.m_DstY[i]);
+            }
+            successes += sum < 5 * static_cast<float>(validation.m_Num);
+        }
+        EXPECT_GE(successes, set.least) << set.name;
+        kelMat truth(3, 3, true);
+        std::ifstream truthFile(folder + set.name + "_H.txt");
+        for (int i = 0; i < 9; ++i)
+            truthFile >> truth.m_Data[i];
+        kelMat back = truth.getInversedMatrix();
+        back.setDataUnitize();
+        EXPECT_TRUE(judgeHomography(truth)) << set.name;
+        EXPECT_EQ(judgeHomography(back), set.plausibleBackwards) << set.name;
+    }
 }
