@@ -67,7 +67,10 @@ std::vector<Input> poisoned(int m, int n, uint32_t salt) {
             input.a.m_Data[place] = value;
             result.push_back(input);
         }
-    kelMat all(m, n);
+    kelMat all(m, n), twoRows = randomMatrix(m, n, salt + 1);
+    for (int r = 0; r < std::min(m, 2); ++r)
+        twoRows[r][0] = kNan;
+    result.push_back({"two rows with NaN", twoRows});
     result.push_back({"all NaN", all + kNan});
     return result;
 }
@@ -220,6 +223,18 @@ TEST(NrCholdc, FactorsTheLowerTriangle) {
         const Truth l = reference<double>(L);
         EXPECT_LT(distance(product(l, transposed(l)), A), 2 * kEps * norm(A));
     }
+}
+
+TEST(InverseByLu, EqualsThePlainLoopsBesideInfinitiesToo) {
+    for (int n : {4, 5, 9, 14})
+        forAllInputs(n, n, [](const kelMat& A) {
+            kelMat R;
+            Reference expected;
+            ASSERT_EQ(A.getInversedMatrix(R), kel_ref::inverse(reference(A), expected));
+            if (R.m_IsCreated) {
+                EXPECT_TRUE(same(R, expected));
+            }
+        });
 }
 
 // ---- singular values -------------------------------------------------------------------------------------------------------

@@ -63,6 +63,10 @@ TEST(CameraDecomposition, GivesTheSameBitsForBothSigns) {
         EXPECT_GE(T[2][0], 0.0f);
     }
     kelMat A, R, T;
+    kelMat P = randomMatrix(3, 4, 50);
+    P[2][3] = 0; // neither sign puts the translation before the camera: the given one stays
+    P.getDecomposedMatrix_ART_3x4(A, R, T);
+    EXPECT_GT(R[2][0] * P[2][0], 0.0f);
     EXPECT_TRUE(kelMat(3, 4).getDecomposedMatrix_ART_3x4(A, R, T)) << "degenerate input is not reported";
     EXPECT_TRUE(std::isnan(R[0][0]));
     EXPECT_STOPS(kelMat(4, 4).getDecomposedMatrix_ART_3x4(A, R, T), "this->m_Width == 4 && this->m_Height == 3", kFile,
