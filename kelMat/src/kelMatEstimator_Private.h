@@ -120,11 +120,6 @@ inline __m128 squaredDistances(__m128 x, __m128 y, __m128 w, __m128 toX, __m128 
     return _mm_add_ps(_mm_mul_ps(dx, dx), _mm_mul_ps(dy, dy));
 }
 
-inline void copyMarks(std::vector<bool>& mask, const Marks& marks, int n) {
-    for (int i = 0; i < n; ++i)
-        mask[i] = marks[i];
-}
-
 // Draws for 99 % confidence of one sample of four inliers, where `count` of n pairs are inliers. The six-point fit uses the same
 // exponent; callers rely on its number of draws.
 inline double drawsNeeded(int count, int n) {
@@ -135,6 +130,72 @@ inline double drawsNeeded(int count, int n) {
 // Truncates toward zero; INT_MIN where no int holds the value.
 inline int truncated(double value) {
     return _mm_cvttsd_si32(_mm_set_sd(value));
+}
+
+// ---- what both estimators do ------------------------------------------------------------------------------------------------
+//
+// A Model tells them apart: Set, the kind of pairs; kColumns of the 3-row matrix; kLeastPairs of a fit; fillRows(row, set, i), the two
+// design rows of a pair; count(M, set, threshold, best, marks), as countInliers(); isPlausible(M).
+
+// The least-squares solution of design rows, scaled so that its last element is 1.
+template <class Model> void solve(kelMat& M, kelMat& A) {
+    smallestSingularVector<3 * Model::kColumns>(A, M.m_Data);
+    M.setDataUnitize();
+}
+
+template <class Model> bool leastSquares(kelMat& M, const typename Model::Set& pairs) {
+    if (pairs.m_Num < Model::kLeastPairs)
+        return false;
+    kelMat A(2 * pairs.m_Num, 3 * Model::kColumns, false);
+    for (int i = 0; i < pairs.m_Num; ++i)
+        Model::fillRows(A[2 * i], pairs, i);
+    solve<Model>(M, A);
+    return true;
+}
+
+template <class Model> bool leastSquaresFine(kelMat& M, typename Model::Set& pairs) {
+    if (pairs.m_Num < Model::kLeastPairs)
+        return false;
+    typename Model::Set normalized;
+    kelMat T1, T2;
+    pairs.normalize(normalized, T1, T2);
+    leastSquares<Model>(M, normalized);
+    denormalize<Model::kColumns>(M, T2, T1);
+    return true;
+}
+
+// The end of a robust fit: least squares on the chosen pairs, of which there are `best`, and again as long as their number grows. The
+// final fit's number of inliers, or -1 where too few are left or a fit is not plausible.
+template <class Model>
+int refit(kelMat& M, const typename Model::Set& pairs, const typename Model::Set& normalized, const kelMat& T1,
+          const kelMat& T2, float threshold, Marks& chosen, int best) {
+    for (;;) {
+        if (best < Model::kLeastPairs)
+            return -1;
+        kelMat A(2 * best, 3 * Model::kColumns, false);
+        for (int i = 0, row = 0; i < pairs.m_Num; ++i)
+            if (chosen[i]) {
+                Model::fillRows(A[row], normalized, i);
+                row += 2;
+            }
+        solve<Model>(M, A);
+        denormalize<Model::kColumns>(M, T2, T1);
+        if (!Model::isPlausible(M))
+            return -1;
+        const int count = Model::count(M, pairs, threshold, kCountAll, chosen.bytes());
+        if (count <= best)
+            return count;
+        best = count;
+    }
+}
+
+// Counts into the caller's mask.
+template <class Model> int judge(const kelMat& M, const typename Model::Set& pairs, std::vector<bool>& mask, float threshold) {
+    Marks marks(pairs.m_Num);
+    const int count = Model::count(M, pairs, threshold, kCountAll, marks.bytes());
+    for (int i = 0; i < pairs.m_Num; ++i)
+        mask[i] = marks[i];
+    return count;
 }
 
 } // namespace kel
