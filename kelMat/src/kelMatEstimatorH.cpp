@@ -69,7 +69,7 @@ bool kelMatEstimatorH::estimate_by4P(float x1_0, float y1_0, float x2_0, float y
     UnitSquareProjection(x2_0, y2_0, x2_1, y2_1, x2_2, y2_2, x2_3, y2_3, G2);
     G2[8] = 1.0f;
     invertUnitSquareProjection(G1, inverse);
-    kel::multiply(m_Data, G2, inverse, 3, 3, 3);
+    kel::multiplySmall<3, 3, 3>(m_Data, G2, inverse);
     return true;
 }
 
@@ -165,14 +165,15 @@ void getRandomIndex(int& a, int& b, int& c, int& d, int n) {
 bool judgeHomography(kelMat& H) {
     constexpr float kLargestScale = 4.0f;
     constexpr double kSmallestScale = 0.1, kLargestPerspective = 0.002;
-    if (H[0][0] * H[1][1] - H[1][0] * H[0][1] < 0.0f)
+    const float* const h = H.m_Data;
+    if (h[0] * h[4] - h[3] * h[1] < 0.0f)
         return false;
     for (int c = 0; c < 2; ++c) {
-        const float scale = std::sqrt(H[0][c] * H[0][c] + H[1][c] * H[1][c]);
+        const float scale = std::sqrt(h[c] * h[c] + h[3 + c] * h[3 + c]);
         if (scale > kLargestScale || static_cast<double>(scale) < kSmallestScale)
             return false;
     }
-    const float perspective = std::sqrt(H[2][0] * H[2][0] + H[2][1] * H[2][1]);
+    const float perspective = std::sqrt(h[6] * h[6] + h[7] * h[7]);
     return !(static_cast<double>(perspective) > kLargestPerspective);
 }
 

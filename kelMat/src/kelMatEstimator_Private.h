@@ -61,11 +61,22 @@ template <int N> void eigenvectorOrNaN(const kelMat& X, int k, float* theta) {
         theta[i] = solved ? X[i][k] : std::numeric_limits<float>::quiet_NaN();
 }
 
+// multiply() for sizes known beforehand.
+template <int Rows, int Inner, int Columns> void multiplySmall(float* R, const float* A, const float* B) {
+    for (int i = 0; i < Rows; ++i)
+        for (int j = 0; j < Columns; ++j) {
+            float sum = 0;
+            for (int k = 0; k < Inner; ++k)
+                sum = A[i * Inner + k] * B[k * Columns + j] + sum;
+            R[i * Columns + j] = sum;
+        }
+}
+
 // (T2 M) T1 into M's own place, scaled so that the last element is 1. M is 3 x columns, T2 3 x 3, T1 columns x columns.
 template <int Columns> void denormalize(kelMat& M, const kelMat& T2, const kelMat& T1) {
     float product[3 * Columns];
-    multiply(product, T2.m_Data, M.m_Data, 3, 3, Columns);
-    multiply(M.m_Data, product, T1.m_Data, 3, Columns, Columns);
+    multiplySmall<3, 3, Columns>(product, T2.m_Data, M.m_Data);
+    multiplySmall<3, Columns, Columns>(M.m_Data, product, T1.m_Data);
     M.setDataUnitize();
 }
 
@@ -90,6 +101,8 @@ inline __m128 fourValues(const std::vector<float>& values, int i, int n) {
     return _mm_load_ps(some);
 }
 
+constexpr uint8_t kBitsOfNibble[16] = {0, 1, 1, 2, 1, 2, 2, 3, 1, 2, 2, 3, 2, 3, 3, 4};
+
 // Counts the pairs whose squared error is below threshold squared and marks them; squaredErrors(i) gives those of pairs i .. i+3.
 // A NaN error is no inlier. Gives up where the count can no longer exceed `best`, and then returns what it has counted so far.
 template <class SquaredErrors> int countInliers(int n, float threshold, int best, uint8_t* marks, SquaredErrors squaredErrors) {
@@ -104,7 +117,7 @@ template <class SquaredErrors> int countInliers(int n, float threshold, int best
             const unsigned valid = end - i >= 8 ? 0xffu : (1u << (end - i)) - 1;
             const unsigned bits = static_cast<unsigned>(high << 4 | low) & valid;
             marks[i / 8] = static_cast<uint8_t>(bits);
-            count += __builtin_popcount(bits);
+            count += kBitsOfNibble[bits & 15] + kBitsOfNibble[bits >> 4];
         }
     }
     return count;
