@@ -181,8 +181,11 @@ TEST(Warp, SamplesAsTheReferenceDoesForAnyHomography) {
         homographies.push_back(h);
     }
     homographies.push_back({1, 1e8f, -1e8f, 0, 1, 0, 0, 0, 1}); // (x + 1e8 y) - 1e8 is not x + (1e8 y - 1e8)
-    for (float w = 6; w < 60; w += 2) // the true quotient is a whole number, that by a reciprocal often less
-        homographies.push_back({w, 0, w / 2, 0, w, w / 2, 0, 0, w});
+    for (int i = 3; i < 120; ++i) { // the true quotient is x + 0.5; one by a reciprocal falls short of it here and there
+        const float w = static_cast<float>(i), reciprocal = 1 / w, at15 = w * 15 + w / 2;
+        if (at15 * reciprocal < 15.5f)
+            homographies.push_back({w, 0, w / 2, 0, w, w / 2, 0, 0, w});
+    }
     for (const auto& h : homographies)
         for (int type : {0, 3, 8, 16})
             for (int width : {1, 3, 4, 7, 16, 19, 37})

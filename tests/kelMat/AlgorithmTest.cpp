@@ -68,9 +68,9 @@ std::vector<Input> poisoned(int m, int n, uint32_t salt) {
             result.push_back(input);
         }
     kelMat all(m, n), twoRows = randomMatrix(m, n, salt + 1);
-    for (int r = 0; r < std::min(m, 2); ++r)
+    for (int r = std::max(0, m - 2); r < m; ++r)
         twoRows[r][0] = kNan;
-    result.push_back({"two rows with NaN", twoRows});
+    result.push_back({"NaN in the last two rows", twoRows});
     result.push_back({"all NaN", all + kNan});
     return result;
 }

@@ -252,6 +252,51 @@ TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
 }
 
 // On noisy data: with exact pairs the factorised matrix is singular, and rounding decides.
+TEST(LeastSquares, TakesTheFirstOfEqualSingularValues) {
+    kelMatCorrespH h;
+    kelMatCorrespP p;
+    for (int i = 0; i < 6; ++i) {
+        h.add(0, 0, 0, 0);
+        p.add(0, 0, 0, 0, 0);
+    }
+    kelMatEstimatorH H, expected;
+    H.estimate_byLSM(h);
+    kel_ref::leastSquares(expected, h);
+    EXPECT_TRUE(sameBits(H, expected));
+    kelMatEstimatorP P, expectedP;
+    P.estimate_byLSM(p);
+    kel_ref::leastSquares(expectedP, p);
+    EXPECT_TRUE(sameBits(P, expectedP));
+}
+
+namespace {
+
+void expectTaubinLikeReference(kelMatCorrespP& set) {
+    kelMatEstimatorP P, expected;
+    testing::internal::CaptureStdout();
+    EXPECT_TRUE(P.estimate_byTaubin(set));
+    const std::string printed = testing::internal::GetCapturedStdout();
+    testing::internal::CaptureStdout();
+    kel_ref::taubin(expected, set);
+    EXPECT_EQ(printed, testing::internal::GetCapturedStdout());
+    EXPECT_TRUE(sameBits(P, expected));
+    EXPECT_EQ(printed.compare(0, 8, "M\n<mat>\n"), 0);
+}
+
+} // namespace
+
+TEST(Taubin, NeverChoosesAnEigenvalueThatNoIntHolds) {
+    std::mt19937 random = kel_test::generator(80);
+    for (int round = 0; round < 8; ++round) { // tiny objects give huge eigenvalues
+        kelMatCorrespP wide, p;
+        addPairs(wide, projection(random), 9, 0, 0, random);
+        for (int i = 0; i < wide.m_Num; ++i)
+            p.add(wide.m_ObjX[i] * 1e-4f, wide.m_ObjY[i] * 1e-4f, wide.m_ObjZ[i] * 1e-4f, wide.m_ImgX[i] / 100,
+                  wide.m_ImgY[i] / 100);
+        expectTaubinLikeReference(p);
+    }
+}
+
 TEST(Taubin, EqualsTheReferenceAndFindsTheTruth) {
     std::mt19937 random = kel_test::generator(74);
     for (int n : {20, 100, 1000}) {
@@ -270,15 +315,7 @@ TEST(Taubin, EqualsTheReferenceAndFindsTheTruth) {
         EXPECT_LT(distanceOf(H, truth), 8.0f) << n;
 
         wideP.normalize(p, T1, T2);
-        kelMatEstimatorP Q, expectedP;
-        testing::internal::CaptureStdout();
-        EXPECT_TRUE(Q.estimate_byTaubin(p));
-        const std::string printed = testing::internal::GetCapturedStdout();
-        testing::internal::CaptureStdout();
-        kel_ref::taubin(expectedP, p);
-        EXPECT_EQ(printed, testing::internal::GetCapturedStdout());
-        EXPECT_TRUE(sameBits(Q, expectedP));
-        EXPECT_EQ(printed.compare(0, 8, "M\n<mat>\n"), 0);
+        expectTaubinLikeReference(p);
     }
 }
 
@@ -387,14 +424,62 @@ TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
         }
     }
     kelMatCorrespH onBound;
-    onBound.add(0, 0, 3, 4);
-    kelMat identity(3, 3, true);
+    kelMatCorrespP onBoundP;
+    for (int i = 0; i < 9; ++i) {
+        onBound.add(0, 0, 3, 4);
+        onBoundP.add(0, 0, 0, 3, 4);
+    }
+    kelMat identity(3, 3, true), flat(3, 4, true);
     identity.setDataIdentity(1);
-    std::vector<bool> mask(1);
+    flat[0][0] = flat[1][1] = flat[2][3] = 1;
+    std::vector<bool> mask(9);
     EXPECT_EQ(judgeInliers(identity, onBound, mask, 5), 0) << "a pair at the threshold is an outlier";
+    EXPECT_EQ(judgeInliers(flat, onBoundP, mask, 5), 0);
     kelMat wrong(3, 4, true);
     EXPECT_STOPS(judgeInliers(wrong, onBound, mask, 5), "this->m_Width == 3 && this->m_Height == 3", "kelMat/src/kelMat.cpp",
                  "void kelMat::cvtPoint(float, float, float*, float*)");
+}
+
+namespace {
+
+void expectRansacLikeReference(kelMatCorrespH& set, unsigned seed) {
+    kelMatEstimatorH H, expected;
+    int count = -5, expectedCount = -5;
+    srand(seed);
+    const bool ok = H.estimate_byRANSAC_fine(set, 2, &count);
+    const int next = rand();
+    srand(seed);
+    EXPECT_EQ(ok, kel_ref::ransac(expected, set, 2, &expectedCount, {5, 4, 50, true}));
+    EXPECT_EQ(next, rand()) << "the number of draws";
+    EXPECT_EQ(count, expectedCount);
+    EXPECT_TRUE(sameBits(H, expected));
+}
+
+void expectRansacLikeReference(kelMatCorrespP& set, unsigned seed) {
+    kelMatEstimatorP P, expected;
+    srand(seed);
+    const bool ok = P.estimate_byRANSAC_fine(set, 4);
+    const int next = rand();
+    srand(seed);
+    EXPECT_EQ(ok, kel_ref::ransac(expected, set, 4, nullptr, {6, 6, 400, false}));
+    EXPECT_EQ(next, rand()) << "the number of draws";
+    EXPECT_TRUE(sameBits(P, expected));
+}
+
+} // namespace
+
+TEST(Ransac, StopsAtEnoughInliersAndNotOneBefore) {
+    std::mt19937 random = kel_test::generator(79);
+    for (int fewer : {0, 1}) {
+        kelMatCorrespH h;
+        addPairs(h, homography(random), 50 - fewer, 0, 0, random);
+        addPairs(h, homography(random), 60, 0, 1, random);
+        expectRansacLikeReference(h, random());
+        kelMatCorrespP p;
+        addPairs(p, projection(random), 400 - fewer, 0, 0, random);
+        addPairs(p, projection(random), 100, 0, 1, random);
+        expectRansacLikeReference(p, random());
+    }
 }
 
 TEST(Ransac, EqualsTheReferenceToTheBitAndToTheDraw) {
@@ -403,28 +488,13 @@ TEST(Ransac, EqualsTheReferenceToTheBitAndToTheDraw) {
         for (float outliers : {0.0f, 0.2f, 0.5f, 0.8f, 1.0f}) {
             kelMatCorrespH h;
             addPairs(h, homography(random), n, 1, outliers, random);
+            SCOPED_TRACE(std::to_string(n) + " pairs, outliers " + std::to_string(outliers));
             const unsigned seed = random();
-            kelMatEstimatorH H, expected;
-            int count = -5, expectedCount = -5;
-            srand(seed);
-            const bool ok = H.estimate_byRANSAC_fine(h, 2, &count);
-            const int next = rand();
-            srand(seed);
-            EXPECT_EQ(ok, kel_ref::ransac(expected, h, 2, &expectedCount, {5, 4, 50, true})) << n << " " << outliers;
-            EXPECT_EQ(next, rand()) << "draws of " << n << " pairs, outliers " << outliers;
-            EXPECT_EQ(count, expectedCount);
-            EXPECT_TRUE(sameBits(H, expected));
+            expectRansacLikeReference(h, seed);
             if (n >= 6 && (n < 100 || outliers < 0.4f)) {
                 kelMatCorrespP p;
                 addPairs(p, projection(random), n, 1, outliers, random);
-                kelMatEstimatorP P, expectedP;
-                srand(seed);
-                const bool okP = P.estimate_byRANSAC_fine(p, 4);
-                const int nextP = rand();
-                srand(seed);
-                EXPECT_EQ(okP, kel_ref::ransac(expectedP, p, 4, nullptr, {6, 6, 400, false})) << n << " " << outliers;
-                EXPECT_EQ(nextP, rand());
-                EXPECT_TRUE(sameBits(P, expectedP));
+                expectRansacLikeReference(p, seed);
             }
         }
 }
