@@ -10,6 +10,7 @@
 #include <iostream>
 #include <map>
 #include <sstream>
+#include <tuple>
 #if KEL_BENCH_OPENCV
 #include <opencv2/core.hpp>
 #endif
@@ -200,8 +201,14 @@ Lines::Lines(void (*addLines)()) {
     adders().push_back(addLines);
 }
 
-ImagePointer image(int width, int height, int type) {
-    ImagePointer made(createKelImage(width, height, type), [](kelImage_t* image) { releaseKelImage(&image); });
+namespace {
+
+ImagePointer owned(kelImage_t* image) {
+    return ImagePointer(image, [](kelImage_t* last) { releaseKelImage(&last); });
+}
+
+ImagePointer render(int width, int height, int type) {
+    ImagePointer made = owned(createKelImage(width, height, type));
     uint32_t state = 1;
     const int bytes = made->channels * made->depth;
     for (int i = 0; i < made->size; ++i) {
@@ -210,6 +217,16 @@ ImagePointer image(int width, int height, int type) {
         made->data[i] = static_cast<unsigned char>(128 + 60 * std::sin(x * 0.05) + 40 * std::cos(y * 0.07) + (state >> 28));
     }
     return made;
+}
+
+} // namespace
+
+ImagePointer image(int width, int height, int type) {
+    static std::map<std::tuple<int, int, int>, ImagePointer> rendered; // once: a run asks for its images many times
+    ImagePointer& original = rendered[{width, height, type}];
+    if (!original)
+        original = render(width, height, type);
+    return owned(cloneKelImage(original.get()));
 }
 
 } // namespace kel_bench

@@ -4,6 +4,7 @@
 #define KEL_IMAGE_CONVERTER_LANES_H
 
 #include "kelImage_Blocks.h"
+#include "kelImage_YuvWide.h"
 
 namespace kel {
 
@@ -25,11 +26,6 @@ template <int N> inline void storeGrey(uint8_t* dst, __m128i grey) {
                 _mm_shuffle_epi8(grey, _mm_setr_epi8(12, 12, 12, -1, 13, 13, 13, -1, 14, 14, 14, -1, 15, 15, 15, -1)));
     }
 }
-
-// YUV to colour, with U' = U - 128 and V' = V - 128:
-//   C = (Y - 16) * kLuma, R = C + kRedV * V', G = C + kGreenU * U' + kGreenV * V', B = C + kBlueU * U',
-// each product rounded to single precision. The portable and the vector form differ in how they sum up G and in how they round.
-constexpr float kLuma = 1.164f, kRedV = 1.793f, kGreenU = -0.213f, kGreenV = -0.534f, kBlueU = 2.115f;
 
 // The products of four pairs of pixels, one pair in a lane. C[0] belongs to the first pixels of the pairs, C[1] to the second.
 struct YuvProducts {

@@ -6,7 +6,6 @@
 using kel::load16;
 using kel::load8;
 using kel::store16;
-using kel::YuvProducts;
 
 namespace {
 
@@ -25,41 +24,20 @@ template <int D, int S, class Body> void walk16(kelImage_t* dst, const kelImage_
     kel::walkBlocks<16, D, S>(d, s, pixelsOfRun(dst, 16), body);
 }
 
-// Bytes of eight pixels from the words of their channels, the first pixels of four pairs before the second ones.
-struct FourChannels8 {
-    __m128i low, high;
-};
-FourChannels8 interleave(__m128i c0, __m128i c1, __m128i c2) {
-    const __m128i inOrder = _mm_setr_epi8(0, 8, 4, 12, 1, 9, 5, 13, 2, 10, 6, 14, 3, 11, 7, 15);
-    const __m128i c01 = _mm_shuffle_epi8(_mm_packus_epi16(c0, c1), inOrder);
-    const __m128i c23 = _mm_shuffle_epi8(_mm_packus_epi16(c2, _mm_setzero_si128()), inOrder);
-    return {_mm_unpacklo_epi16(c01, c23), _mm_unpackhi_epi16(c01, c23)};
-}
-
-// C + chroma of the eight pixels of four pairs, rounded by the thread's rounding mode.
-__m128i roundedChannel(const YuvProducts& p, __m128 chroma) {
-    return _mm_packs_epi32(_mm_cvtps_epi32(_mm_add_ps(p.C[0], chroma)), _mm_cvtps_epi32(_mm_add_ps(p.C[1], chroma)));
-}
-
-FourChannels8 colour(__m128i pairs, bool blueFirst) {
-    const YuvProducts p = kel::yuvProducts(pairs);
-    const __m128i red = roundedChannel(p, p.redV);
-    const __m128i green = roundedChannel(p, _mm_add_ps(p.greenU, p.greenV));
-    const __m128i blue = roundedChannel(p, p.blueU);
-    return blueFirst ? interleave(blue, green, red) : interleave(red, green, blue);
-}
-
-// Blocks of 4 pixels, two of them at once where they last.
-template <bool blueFirst> void yuvToFourChannels(kelImage_t* dst, const kelImage_t* src) {
+// Blocks of 4 pixels, as many of them at once as the processor can. A last one is done within a block of 8 of its own: it
+// reads and writes nothing beyond its 8 and 16 bytes.
+void yuvToFourChannels(kelImage_t* dst, const kelImage_t* src, bool blueFirst) {
     uint8_t* d = dst->data;
     const uint8_t* s = src->data;
-    const ptrdiff_t rest = kel::walkBlocks<8, 4, 2>(d, s, pixelsOfRun(dst, 4), [](uint8_t* to, const uint8_t* from) {
-        const FourChannels8 pixels = colour(load16(from), blueFirst);
-        store16(to, pixels.low);
-        store16(to + 16, pixels.high);
-    });
-    if (rest > 0)
-        store16(d, colour(load8(s), blueFirst).low);
+    const ptrdiff_t rest =
+        kel::yuvToFourChannels128(d, s, kel::widestYuvRun()(d, s, pixelsOfRun(dst, 4), blueFirst), blueFirst);
+    if (rest > 0) {
+        uint8_t from[16], to[32], *toEnd = to;
+        const uint8_t* fromEnd = from;
+        store16(from, load8(s));
+        kel::yuvToFourChannels128(toEnd, fromEnd, 8, blueFirst);
+        store16(d, load16(to));
+    }
 }
 
 } // namespace
@@ -89,11 +67,11 @@ void convertKelImageSSE_U8YUV_to_U8G(kelImage_t* dst, const kelImage_t* src) {
 }
 
 void convertKelImageSSE_U8YUV_to_U8RGBA(kelImage_t* dst, const kelImage_t* src) {
-    yuvToFourChannels<false>(dst, src);
+    yuvToFourChannels(dst, src, false);
 }
 
 void convertKelImageSSE_U8YUV_to_U8BGRA(kelImage_t* dst, const kelImage_t* src) {
-    yuvToFourChannels<true>(dst, src);
+    yuvToFourChannels(dst, src, true);
 }
 
 // The two to three channels are inert; the portable converters do these.

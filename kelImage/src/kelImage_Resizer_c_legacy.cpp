@@ -338,14 +338,18 @@ __m128i halfOfSum(__m128i a, __m128i b) {
     return _mm_sub_epi8(_mm_avg_epu8(a, b), _mm_and_si128(_mm_xor_si128(a, b), _mm_set1_epi8(1)));
 }
 
+// Four averages of pairs of neighbours.
+__m128i halvedAcross(const uint32_t* from) {
+    const __m128i low = load(from), high = load(from + 4);
+    return halfOfSum(everySecond<false>(low, high, Pixel<4>()), everySecond<true>(low, high, Pixel<4>()));
+}
+
 template <class Sums>
 void averageAcross(uint32_t* to, const uint32_t* from, const Ratio& ratio, const Box* boxes, kelValue_s32 width) {
     kelValue_s32 j = 0;
     if (ratio.isHalf())
-        for (; j + 4 <= width; j += 4) {
-            const __m128i low = load(from + 2 * j), high = load(from + 2 * j + 4);
-            store(to + j, halfOfSum(everySecond<false>(low, high, Pixel<4>()), everySecond<true>(low, high, Pixel<4>())));
-        }
+        for (; j + 4 <= width; j += 4)
+            store(to + j, halvedAcross(from + 2 * j));
     for (; j < width; ++j)
         to[j] = static_cast<uint32_t>(averageOf<Sums>(boxes[j], ratio, [=](kelValue_s32 k) { return uint64_t(from[k]); }));
 }
@@ -367,6 +371,16 @@ void averageDown(uint32_t* to, const Box& box, const Ratio& ratio, kelValue_s32 
     }
     if (x < width)
         to[x] = static_cast<uint32_t>(averageOf<Sums>(box, ratio, [=](kelValue_s32 k) { return uint64_t(rowAt(k)[x]); }));
+}
+
+// Two to one both ways, the ratio of pyramids, without rows in between; for widths of whole blocks of four.
+void halveBothWays(kelImage_t* dst, const kelImage_t* src) {
+    for (kelValue_s32 y = 0; y < dst->height; ++y) {
+        uint32_t* const to = rowByWidth<uint32_t>(dst, y);
+        const uint32_t *const above = rowByWidth<uint32_t>(src, 2 * y), *const below = rowByWidth<uint32_t>(src, 2 * y + 1);
+        for (kelValue_s32 x = 0; x < dst->width; x += 4)
+            store(to + x, halfOfSum(halvedAcross(above + 2 * x), halvedAcross(below + 2 * x)));
+    }
 }
 
 template <class AcrossSums, class DownSums>
@@ -483,7 +497,9 @@ void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
 
 void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src) {
     const Ratio across(dst->width, src->width), down(dst->height, src->height);
-    if (across.box <= kWordBox)
+    if (across.isHalf() && down.isHalf() && dst->width % 4 == 0)
+        halveBothWays(dst, src);
+    else if (across.box <= kWordBox)
         down.box <= kWordBox ? reduce<WordSums, WordSums>(dst, src, across, down)
                              : reduce<WordSums, LongSums>(dst, src, across, down);
     else

@@ -5,8 +5,7 @@
 
 namespace {
 
-constexpr int kLeastPairs = 5; // of the over-determined fits
-constexpr int kUnknowns = 9;   // h00 h01 h02 h10 ... h22
+constexpr int kUnknowns = 9; // h00 h01 h02 h10 ... h22
 
 // Two design rows of a pair, theta times each of which a right homography makes zero:
 // | 0   0   0  -x1 -y1 -1   y2 x1   y2 y1   y2 |
@@ -15,12 +14,6 @@ void fillRows(float* row, float x1, float y1, float x2, float y2) {
     const float rows[2 * kUnknowns] = {0,  0,  0, -x1, -y1, -1, y2 * x1,  y2 * y1,  y2, //
                                        x1, y1, 1, 0,   0,   0,  -x2 * x1, -x2 * y1, -x2};
     std::copy_n(rows, 2 * kUnknowns, row);
-}
-
-// The least-squares solution of design rows, scaled so that H[2][2] is 1.
-void solve(kelMat& H, kelMat& A) {
-    kel::smallestSingularVector<kUnknowns>(A, H.m_Data);
-    H.setDataUnitize();
 }
 
 // G is the unit square's homography with a last element of 1; the result is the adjugate over the determinant.
@@ -50,6 +43,18 @@ int countTransfers(const kelMat& H, const kelMatCorrespH& corresp, float thresho
     });
 }
 
+struct Model {
+    using Set = kelMatCorrespH;
+    static constexpr int kColumns = 3, kLeastPairs = 5;
+    static void fillRows(float* row, const Set& set, int i) {
+        ::fillRows(row, set.m_SrcX[i], set.m_SrcY[i], set.m_DstX[i], set.m_DstY[i]);
+    }
+    static int count(const kelMat& H, const Set& set, float threshold, int best, uint8_t* marks) {
+        return countTransfers(H, set, threshold, best, marks);
+    }
+    static bool isPlausible(kelMat& H) { return judgeHomography(H); }
+};
+
 } // namespace
 
 kelMatEstimatorH::kelMatEstimatorH() : kelMat(3, 3, true) {}
@@ -64,35 +69,21 @@ bool kelMatEstimatorH::estimate_by4P(float x1_0, float y1_0, float x2_0, float y
     UnitSquareProjection(x2_0, y2_0, x2_1, y2_1, x2_2, y2_2, x2_3, y2_3, G2);
     G2[8] = 1.0f;
     invertUnitSquareProjection(G1, inverse);
-    kel::multiply(m_Data, G2, inverse, 3, 3, 3);
+    kel::multiplySmall<3, 3, 3>(m_Data, G2, inverse);
     return true;
 }
 
 bool kelMatEstimatorH::estimate_byLSM(kelMatCorrespH& corresp) {
-    const int n = corresp.m_Num;
-    if (n < kLeastPairs)
-        return false;
-    kelMat A(2 * n, kUnknowns, false);
-    for (int i = 0; i < n; ++i)
-        fillRows(A[2 * i], corresp.m_SrcX[i], corresp.m_SrcY[i], corresp.m_DstX[i], corresp.m_DstY[i]);
-    solve(*this, A);
-    return true;
+    return kel::leastSquares<Model>(*this, corresp);
 }
 
 bool kelMatEstimatorH::estimate_byLSM_fine(kelMatCorrespH& corresp) {
-    if (corresp.m_Num < kLeastPairs)
-        return false;
-    kelMatCorrespH normalized;
-    kelMat T1, T2;
-    corresp.normalize(normalized, T1, T2);
-    estimate_byLSM(normalized);
-    kel::denormalize<3>(*this, T2, T1);
-    return true;
+    return kel::leastSquaresFine<Model>(*this, corresp);
 }
 
 bool kelMatEstimatorH::estimate_byTaubin(kelMatCorrespH& corresp) {
     const int n = corresp.m_Num;
-    if (n < kLeastPairs)
+    if (n < Model::kLeastPairs)
         return false;
     kel::Moments<kUnknowns> ofRows, ofDerivatives;
     for (int i = 0; i < n; ++i) {
@@ -151,28 +142,10 @@ bool kelMatEstimatorH::estimate_byRANSAC_fine(kelMatCorrespH& corresp, float thr
         }
     } while (best < kEnoughInliers && ++draw < draws);
 
-    for (;;) {
-        if (best < kLeastPairs)
-            return false;
-        kelMat A(2 * best, kUnknowns, false);
-        float* row = A.m_Data;
-        for (int i = 0; i < n; ++i)
-            if (chosen[i]) {
-                fillRows(row, x1[i], y1[i], x2[i], y2[i]);
-                row += 2 * kUnknowns;
-            }
-        solve(*this, A);
-        kel::denormalize<3>(*this, T2, T1);
-        if (!judgeHomography(*this))
-            return false;
-        const int count = countTransfers(*this, corresp, threshold, kel::kCountAll, chosen.bytes());
-        if (count <= best) {
-            if (inliers)
-                *inliers = count;
-            return true;
-        }
-        best = count;
-    }
+    const int count = kel::refit<Model>(*this, corresp, normalized, T1, T2, threshold, chosen, best);
+    if (count >= 0 && inliers)
+        *inliers = count;
+    return count >= 0;
 }
 
 void getRandomIndex(int& a, int& b, int& c, int& d, int n) {
@@ -192,27 +165,24 @@ void getRandomIndex(int& a, int& b, int& c, int& d, int n) {
 bool judgeHomography(kelMat& H) {
     constexpr float kLargestScale = 4.0f;
     constexpr double kSmallestScale = 0.1, kLargestPerspective = 0.002;
-    if (H[0][0] * H[1][1] - H[1][0] * H[0][1] < 0.0f)
+    const float* const h = H.m_Data;
+    if (h[0] * h[4] - h[3] * h[1] < 0.0f)
         return false;
     for (int c = 0; c < 2; ++c) {
-        const float scale = std::sqrt(H[0][c] * H[0][c] + H[1][c] * H[1][c]);
+        const float scale = std::sqrt(h[c] * h[c] + h[3 + c] * h[3 + c]);
         if (scale > kLargestScale || static_cast<double>(scale) < kSmallestScale)
             return false;
     }
-    const float perspective = std::sqrt(H[2][0] * H[2][0] + H[2][1] * H[2][1]);
+    const float perspective = std::sqrt(h[6] * h[6] + h[7] * h[7]);
     return !(static_cast<double>(perspective) > kLargestPerspective);
 }
 
 int judgeInliers(kelMat& H, kelMatCorrespH& corresp, std::vector<bool>& mask, float threshold) {
-    const int n = corresp.m_Num;
-    if (n < 1)
+    if (corresp.m_Num < 1)
         return 0;
     if (H.m_Width != 3 || H.m_Height != 3) {
         float x, y;
         H.cvtPoint(0.0f, 0.0f, &x, &y); // stops the process on the size
     }
-    kel::Marks marks(n);
-    const int count = countTransfers(H, corresp, threshold, kel::kCountAll, marks.bytes());
-    kel::copyMarks(mask, marks, n);
-    return count;
+    return kel::judge<Model>(H, corresp, mask, threshold);
 }

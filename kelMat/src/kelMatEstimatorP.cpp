@@ -6,7 +6,6 @@
 
 namespace {
 
-constexpr int kLeastPairs = 6;
 constexpr int kUnknowns = 12; // p00 p01 p02 p03 p10 ... p23
 
 // Two design rows of a pair, theta times each of which a right projection makes zero:
@@ -16,16 +15,6 @@ void fillRows(float* row, float X, float Y, float Z, float x, float y) {
     const float rows[2 * kUnknowns] = {X, Y, Z, 1, 0, 0, 0, 0, -x * X, -x * Y, -x * Z, -x, //
                                        0, 0, 0, 0, X, Y, Z, 1, -y * X, -y * Y, -y * Z, -y};
     std::copy_n(rows, 2 * kUnknowns, row);
-}
-
-void fillRows(float* row, const kelMatCorrespP& corresp, int i) {
-    fillRows(row, corresp.m_ObjX[i], corresp.m_ObjY[i], corresp.m_ObjZ[i], corresp.m_ImgX[i], corresp.m_ImgY[i]);
-}
-
-// The least-squares solution of design rows, scaled so that P[2][3] is 1.
-void solve(kelMat& P, kelMat& A) {
-    kel::smallestSingularVector<kUnknowns>(A, P.m_Data);
-    P.setDataUnitize();
 }
 
 // countInliers() for a projection.
@@ -43,6 +32,18 @@ int countProjections(const kelMat& P, const kelMatCorrespP& corresp, float thres
                                      kel::fourValues(corresp.m_ImgX, i, n), kel::fourValues(corresp.m_ImgY, i, n));
     });
 }
+
+struct Model {
+    using Set = kelMatCorrespP;
+    static constexpr int kColumns = 4, kLeastPairs = 6;
+    static void fillRows(float* row, const Set& set, int i) {
+        ::fillRows(row, set.m_ObjX[i], set.m_ObjY[i], set.m_ObjZ[i], set.m_ImgX[i], set.m_ImgY[i]);
+    }
+    static int count(const kelMat& P, const Set& set, float threshold, int best, uint8_t* marks) {
+        return countProjections(P, set, threshold, best, marks);
+    }
+    static bool isPlausible(kelMat& P) { return judgeMatrixP(P); }
+};
 
 void printBlock(const char* title, kelMat& M) {
     puts(title);
@@ -74,30 +75,16 @@ kelMatEstimatorP::kelMatEstimatorP() : kelMat(3, 4, true) {}
 kelMatEstimatorP::~kelMatEstimatorP() {}
 
 bool kelMatEstimatorP::estimate_byLSM(kelMatCorrespP& corresp) {
-    const int n = corresp.m_Num;
-    if (n < kLeastPairs)
-        return false;
-    kelMat A(2 * n, kUnknowns, false);
-    for (int i = 0; i < n; ++i)
-        fillRows(A[2 * i], corresp, i);
-    solve(*this, A);
-    return true;
+    return kel::leastSquares<Model>(*this, corresp);
 }
 
 bool kelMatEstimatorP::estimate_byLSM_fine(kelMatCorrespP& corresp) {
-    if (corresp.m_Num < kLeastPairs)
-        return false;
-    kelMatCorrespP normalized;
-    kelMat T1, T2;
-    corresp.normalize(normalized, T1, T2);
-    estimate_byLSM(normalized);
-    kel::denormalize<4>(*this, T2, T1);
-    return true;
+    return kel::leastSquaresFine<Model>(*this, corresp);
 }
 
 bool kelMatEstimatorP::estimate_byTaubin(kelMatCorrespP& corresp) {
     const int n = corresp.m_Num;
-    if (n < kLeastPairs)
+    if (n < Model::kLeastPairs)
         return false;
     kel::Moments<kUnknowns> ofRows, ofDerivatives;
     for (int i = 0; i < n; ++i) {
@@ -139,7 +126,7 @@ bool kelMatEstimatorP::estimate_byTaubin(kelMatCorrespP& corresp) {
 bool kelMatEstimatorP::estimate_byRANSAC_fine(kelMatCorrespP& corresp, float threshold) {
     constexpr int kSample = 6, kMostDraws = 1500, kEnoughInliers = 400;
     const int n = corresp.m_Num;
-    if (n < kLeastPairs)
+    if (n < Model::kLeastPairs)
         return false;
     kelMatCorrespP normalized;
     kelMat T1, T2;
@@ -152,8 +139,8 @@ bool kelMatEstimatorP::estimate_byRANSAC_fine(kelMatCorrespP& corresp, float thr
         int index[kSample];
         getRandomIndex(n, index[0], index[1], index[2], index[3], index[4], index[5]);
         for (int i = 0; i < kSample; ++i)
-            fillRows(sample[2 * i], normalized, index[i]);
-        solve(*this, sample);
+            Model::fillRows(sample[2 * i], normalized, index[i]);
+        kel::solve<Model>(*this, sample);
         kel::denormalize<4>(*this, T2, T1);
         if (judgeMatrixP(*this)) {
             const int count = countProjections(*this, corresp, threshold, best, current.bytes());
@@ -167,24 +154,7 @@ bool kelMatEstimatorP::estimate_byRANSAC_fine(kelMatCorrespP& corresp, float thr
         }
     } while (best < kEnoughInliers && ++draw < draws);
 
-    for (;;) {
-        if (best < kLeastPairs)
-            return false;
-        kelMat A(2 * best, kUnknowns, false);
-        for (int i = 0, row = 0; i < n; ++i)
-            if (chosen[i]) {
-                fillRows(A[row], normalized, i);
-                row += 2;
-            }
-        solve(*this, A);
-        kel::denormalize<4>(*this, T2, T1);
-        if (!judgeMatrixP(*this))
-            return false;
-        const int count = countProjections(*this, corresp, threshold, kel::kCountAll, chosen.bytes());
-        if (count <= best)
-            return true;
-        best = count;
-    }
+    return kel::refit<Model>(*this, corresp, normalized, T1, T2, threshold, chosen, best) >= 0;
 }
 
 void getRandomIndex(int n, int& a, int& b, int& c, int& d, int& e, int& f) {
@@ -204,15 +174,11 @@ bool judgeMatrixP(kelMat&) {
 }
 
 int judgeInliers(kelMat& P, kelMatCorrespP& corresp, std::vector<bool>& mask, float threshold) {
-    const int n = corresp.m_Num;
-    if (n < 1)
+    if (corresp.m_Num < 1)
         return 0;
     if (P.m_Width != 4 || P.m_Height != 3) {
         float x, y;
         P.cvtPoint(0.0f, 0.0f, 0.0f, &x, &y); // stops the process on the size
     }
-    kel::Marks marks(n);
-    const int count = countProjections(P, corresp, threshold, kel::kCountAll, marks.bytes());
-    kel::copyMarks(mask, marks, n);
-    return count;
+    return kel::judge<Model>(P, corresp, mask, threshold);
 }

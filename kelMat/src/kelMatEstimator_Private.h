@@ -61,11 +61,22 @@ template <int N> void eigenvectorOrNaN(const kelMat& X, int k, float* theta) {
         theta[i] = solved ? X[i][k] : std::numeric_limits<float>::quiet_NaN();
 }
 
+// multiply() for sizes known beforehand.
+template <int Rows, int Inner, int Columns> void multiplySmall(float* R, const float* A, const float* B) {
+    for (int i = 0; i < Rows; ++i)
+        for (int j = 0; j < Columns; ++j) {
+            float sum = 0;
+            for (int k = 0; k < Inner; ++k)
+                sum = A[i * Inner + k] * B[k * Columns + j] + sum;
+            R[i * Columns + j] = sum;
+        }
+}
+
 // (T2 M) T1 into M's own place, scaled so that the last element is 1. M is 3 x columns, T2 3 x 3, T1 columns x columns.
 template <int Columns> void denormalize(kelMat& M, const kelMat& T2, const kelMat& T1) {
     float product[3 * Columns];
-    multiply(product, T2.m_Data, M.m_Data, 3, 3, Columns);
-    multiply(M.m_Data, product, T1.m_Data, 3, Columns, Columns);
+    multiplySmall<3, 3, Columns>(product, T2.m_Data, M.m_Data);
+    multiplySmall<3, Columns, Columns>(M.m_Data, product, T1.m_Data);
     M.setDataUnitize();
 }
 
@@ -90,6 +101,8 @@ inline __m128 fourValues(const std::vector<float>& values, int i, int n) {
     return _mm_load_ps(some);
 }
 
+constexpr uint8_t kBitsOfNibble[16] = {0, 1, 1, 2, 1, 2, 2, 3, 1, 2, 2, 3, 2, 3, 3, 4};
+
 // Counts the pairs whose squared error is below threshold squared and marks them; squaredErrors(i) gives those of pairs i .. i+3.
 // A NaN error is no inlier. Gives up where the count can no longer exceed `best`, and then returns what it has counted so far.
 template <class SquaredErrors> int countInliers(int n, float threshold, int best, uint8_t* marks, SquaredErrors squaredErrors) {
@@ -104,7 +117,7 @@ template <class SquaredErrors> int countInliers(int n, float threshold, int best
             const unsigned valid = end - i >= 8 ? 0xffu : (1u << (end - i)) - 1;
             const unsigned bits = static_cast<unsigned>(high << 4 | low) & valid;
             marks[i / 8] = static_cast<uint8_t>(bits);
-            count += __builtin_popcount(bits);
+            count += kBitsOfNibble[bits & 15] + kBitsOfNibble[bits >> 4];
         }
     }
     return count;
@@ -120,11 +133,6 @@ inline __m128 squaredDistances(__m128 x, __m128 y, __m128 w, __m128 toX, __m128 
     return _mm_add_ps(_mm_mul_ps(dx, dx), _mm_mul_ps(dy, dy));
 }
 
-inline void copyMarks(std::vector<bool>& mask, const Marks& marks, int n) {
-    for (int i = 0; i < n; ++i)
-        mask[i] = marks[i];
-}
-
 // Draws for 99 % confidence of one sample of four inliers, where `count` of n pairs are inliers. The six-point fit uses the same
 // exponent; callers rely on its number of draws.
 inline double drawsNeeded(int count, int n) {
@@ -135,6 +143,72 @@ inline double drawsNeeded(int count, int n) {
 // Truncates toward zero; INT_MIN where no int holds the value.
 inline int truncated(double value) {
     return _mm_cvttsd_si32(_mm_set_sd(value));
+}
+
+// ---- what both estimators do ------------------------------------------------------------------------------------------------
+//
+// A Model tells them apart: Set, the kind of pairs; kColumns of the 3-row matrix; kLeastPairs of a fit; fillRows(row, set, i), the two
+// design rows of a pair; count(M, set, threshold, best, marks), as countInliers(); isPlausible(M).
+
+// The least-squares solution of design rows, scaled so that its last element is 1.
+template <class Model> void solve(kelMat& M, kelMat& A) {
+    smallestSingularVector<3 * Model::kColumns>(A, M.m_Data);
+    M.setDataUnitize();
+}
+
+template <class Model> bool leastSquares(kelMat& M, const typename Model::Set& pairs) {
+    if (pairs.m_Num < Model::kLeastPairs)
+        return false;
+    kelMat A(2 * pairs.m_Num, 3 * Model::kColumns, false);
+    for (int i = 0; i < pairs.m_Num; ++i)
+        Model::fillRows(A[2 * i], pairs, i);
+    solve<Model>(M, A);
+    return true;
+}
+
+template <class Model> bool leastSquaresFine(kelMat& M, typename Model::Set& pairs) {
+    if (pairs.m_Num < Model::kLeastPairs)
+        return false;
+    typename Model::Set normalized;
+    kelMat T1, T2;
+    pairs.normalize(normalized, T1, T2);
+    leastSquares<Model>(M, normalized);
+    denormalize<Model::kColumns>(M, T2, T1);
+    return true;
+}
+
+// The end of a robust fit: least squares on the chosen pairs, of which there are `best`, and again as long as their number grows. The
+// final fit's number of inliers, or -1 where too few are left or a fit is not plausible.
+template <class Model>
+int refit(kelMat& M, const typename Model::Set& pairs, const typename Model::Set& normalized, const kelMat& T1,
+          const kelMat& T2, float threshold, Marks& chosen, int best) {
+    for (;;) {
+        if (best < Model::kLeastPairs)
+            return -1;
+        kelMat A(2 * best, 3 * Model::kColumns, false);
+        for (int i = 0, row = 0; i < pairs.m_Num; ++i)
+            if (chosen[i]) {
+                Model::fillRows(A[row], normalized, i);
+                row += 2;
+            }
+        solve<Model>(M, A);
+        denormalize<Model::kColumns>(M, T2, T1);
+        if (!Model::isPlausible(M))
+            return -1;
+        const int count = Model::count(M, pairs, threshold, kCountAll, chosen.bytes());
+        if (count <= best)
+            return count;
+        best = count;
+    }
+}
+
+// Counts into the caller's mask.
+template <class Model> int judge(const kelMat& M, const typename Model::Set& pairs, std::vector<bool>& mask, float threshold) {
+    Marks marks(pairs.m_Num);
+    const int count = Model::count(M, pairs, threshold, kCountAll, marks.bytes());
+    for (int i = 0; i < pairs.m_Num; ++i)
+        mask[i] = marks[i];
+    return count;
 }
 
 } // namespace kel

@@ -114,6 +114,10 @@ TEST(ZeroOrderHold, AveragesByAnyRatio) {
                         for (int toRows : {1, 3, 4, 20})
                             compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {to, toRows}, {from, rows}, 16,
                                     Guard::Behind, fill);
+    for (int width = 1; width <= 36; ++width)
+        for (Fill fill : {Fill::Random, Fill::Alternating, Fill::Ramp})
+            compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {width, 3}, {2 * width, 6}, 16, Guard::Behind,
+                    fill);
     // Boxes too large for the reciprocal.
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 1}, {4099, 2}, 32);
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {3, 1}, {4106, 1}, 32);
