@@ -121,11 +121,12 @@ public:
         const kelValue_s32 end = m_laplacian->width - kBorder;
         for (kelValue_s32 block = kBorder - 1; block < end; block += kBlock) {
             unsigned mask = candidates(response + block, m_laplacian->step);
-            for (; mask != 0; mask &= mask - 1) {
-                const kelValue_s32 x = block + __builtin_ctz(mask);
-                m_columns[m_pending] = x;
-                m_pending += x >= kBorder && x < end;
-            }
+            if (block < kBorder)
+                mask &= ~1u;
+            if (end - block < kBlock) // columns behind the last may be padding, whose bytes are anyone's
+                mask &= (1u << (end - block)) - 1;
+            for (; mask != 0; mask &= mask - 1)
+                m_columns[m_pending++] = block + __builtin_ctz(mask);
             if (m_pending > kCapacity - kBlock)
                 judge(y);
         }
