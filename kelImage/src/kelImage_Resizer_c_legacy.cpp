@@ -477,9 +477,16 @@ void resizeKelImageHalf(kelImage_t* dst, const kelImage_t* src) {
 
 void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
     const Steps across(dst->width, src->width), down(dst->height, src->height);
-    Buffer<uint32_t> above = allocate<uint32_t>(dst->width), below = allocate<uint32_t>(dst->width);
-    const auto interpolated = [&](Buffer<uint32_t>& to, kelValue_s32 y) { // the row below the last one is the last one
-        interpolateAcross(to.get(), rowByWidth<uint32_t>(src, std::min(y, src->height - 1)), across, dst->width);
+    const kelValue_s32 end = src->height - 1; // the row below the last one is the last one
+    Buffer<uint32_t> above = allocate<uint32_t>(dst->width), below = allocate<uint32_t>(dst->width),
+                     last = allocate<uint32_t>(dst->width);
+    // The last row first: it reads the pixel behind the source, which may be the destination's.
+    interpolateAcross(last.get(), rowByWidth<uint32_t>(src, end), across, dst->width);
+    const auto interpolated = [&](Buffer<uint32_t>& to, kelValue_s32 y) {
+        if (y < end)
+            interpolateAcross(to.get(), rowByWidth<uint32_t>(src, y), across, dst->width);
+        else
+            memcpy(to.get(), last.get(), static_cast<size_t>(dst->width) * sizeof(uint32_t));
     };
     kelValue_s32 current = 0;
     interpolated(above, 0);

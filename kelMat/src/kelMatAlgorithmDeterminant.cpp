@@ -2,13 +2,13 @@
 #include "kelMat_Private.h"
 
 float kel_getDeterminant_2x2(const kelMat& A) {
-    const float *const a = A.m_Data, *const b = a + 2;
+    const float *const a = A[0], *const b = A[1];
     return a[0] * b[1] - a[1] * b[0];
 }
 
 // Along the last column, summed from its top.
 float kel_getDeterminant_3x3(const kelMat& A) {
-    const float *const a = A.m_Data, *const b = a + 3, *const c = b + 3;
+    const float *const a = A[0], *const b = A[1], *const c = A[2];
     const float top = (b[0] * c[1] - b[1] * c[0]) * a[2];
     const float middle = (c[0] * a[1] - c[1] * a[0]) * b[2] + top;
     return (a[0] * b[1] - a[1] * b[0]) * c[2] + middle;

@@ -8,7 +8,7 @@ bool kel_getInversedMatrix_2x2(const kelMat& A, kelMat& R) {
     const float det = A.getDeterminant();
     if (det == 0.0f)
         return false;
-    const float *const a = A.m_Data, *const b = a + 2;
+    const float *const a = A[0], *const b = A[1];
     const float inverse[] = {b[1] / det, -a[1] / det, -b[0] / det, a[0] / det};
     R.create(2, 2, false);
     std::copy_n(inverse, 4, R.m_Data);
@@ -19,7 +19,7 @@ bool kel_getInversedMatrix_3x3(const kelMat& A, kelMat& R) {
     const float det = A.getDeterminant();
     if (det == 0.0f)
         return false;
-    const float *const a = A.m_Data, *const b = a + 3, *const c = b + 3;
+    const float *const a = A[0], *const b = A[1], *const c = A[2];
     const float inverse[] = {
         (b[1] * c[2] - b[2] * c[1]) / det, (c[1] * a[2] - c[2] * a[1]) / det, (a[1] * b[2] - a[2] * b[1]) / det,
         (b[2] * c[0] - b[0] * c[2]) / det, (c[2] * a[0] - c[0] * a[2]) / det, (a[2] * b[0] - a[0] * b[2]) / det,
@@ -56,6 +56,14 @@ bool isFinite(const kelMat& A) {
                        [](float x) { return std::isfinite(x); });
 }
 
+// Whether no row was swapped with one above it, as a column without a candidate (all NaN) may have it.
+bool swapsDownward(const int* indx, int n) {
+    for (int i = 0; i < n; ++i)
+        if (indx[i] < i)
+            return false;
+    return true;
+}
+
 } // namespace
 
 bool kel_getInversedMatrix_NxN(const kelMat& A, kelMat& R) {
@@ -66,11 +74,11 @@ bool kel_getInversedMatrix_NxN(const kelMat& A, kelMat& R) {
     if (!nr_ludcmp(LU, indx.data(), &parity))
         return false;
     R.create(n, n, false);
-    if (isFinite(LU)) {
+    if (isFinite(LU) && swapsDownward(indx.data(), n)) {
         solveIdentity(LU.m_Data, indx.data(), n, R.m_Data);
         return true;
     }
-    // One by one: nr_lubksb() skips the leading zeros of each column, which matters to infinities.
+    // One by one: nr_lubksb() skips the leading zeros of each column, which matters to infinities and to swaps upward.
     kel::Scratch<float, kel::kSmallOrder> column(n);
     for (int j = 0; j < n; ++j) {
         std::fill_n(column.data(), n, 0.0f);

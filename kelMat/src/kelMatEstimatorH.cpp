@@ -165,15 +165,15 @@ void getRandomIndex(int& a, int& b, int& c, int& d, int n) {
 bool judgeHomography(kelMat& H) {
     constexpr float kLargestScale = 4.0f;
     constexpr double kSmallestScale = 0.1, kLargestPerspective = 0.002;
-    const float* const h = H.m_Data;
-    if (h[0] * h[4] - h[3] * h[1] < 0.0f)
+    const float *const h0 = H[0], *const h1 = H[1], *const h2 = H[2];
+    if (h0[0] * h1[1] - h1[0] * h0[1] < 0.0f)
         return false;
     for (int c = 0; c < 2; ++c) {
-        const float scale = std::sqrt(h[c] * h[c] + h[3 + c] * h[3 + c]);
+        const float scale = std::sqrt(h0[c] * h0[c] + h1[c] * h1[c]);
         if (scale > kLargestScale || static_cast<double>(scale) < kSmallestScale)
             return false;
     }
-    const float perspective = std::sqrt(h[6] * h[6] + h[7] * h[7]);
+    const float perspective = std::sqrt(h2[0] * h2[0] + h2[1] * h2[1]);
     return !(static_cast<double>(perspective) > kLargestPerspective);
 }
 

@@ -1,5 +1,4 @@
 // Synthetic camera projections, composed from object, camera and view, fixed or random.
-#include <algorithm>
 #include <cstdlib>
 
 #include "kelMat.h"
@@ -8,7 +7,7 @@ namespace {
 
 // Uniform between a and b in either order, by the runtime's generator, in single precision throughout.
 float rand(float a, float b) {
-    const float lo = std::min(a, b), hi = std::max(a, b);
+    const float lo = a > b ? b : a, hi = a > b ? a : b;
     const float r = static_cast<float>(::rand());
     return ((hi - lo) * r) * 4.656612873077393e-10f + lo;
 }

@@ -280,3 +280,17 @@ TEST(DecompositionMemory, KeepsSmallTemporariesOffTheHeap) {
         EXPECT_EQ(allocations([&](kelMat& R, kelMat&, kelMat&) { M.getInversedMatrix_Pseudo(R); }), 3);
     }
 }
+
+// The kernels take the top-left block of wider matrices.
+TEST(Inverse, KernelsReadRowsOfWiderMatrices) {
+    kelMat A(3, 4, true), R;
+    for (int i = 0; i < 12; ++i)
+        A.m_Data[i] = static_cast<float>(i * i + 1);
+    EXPECT_EQ(kel_getDeterminant_2x2(A), A[0][0] * A[1][1] - A[0][1] * A[1][0]);
+    kelMat block(3, 3, true);
+    block.setData(A);
+    EXPECT_EQ(kel_getDeterminant_3x3(A), block.getDeterminant());
+    ASSERT_TRUE(kel_getInversedMatrix_2x2(block, R)); // by the determinant of all of it
+    EXPECT_EQ(R[0][0], block[1][1] / block.getDeterminant());
+    EXPECT_EQ(R[1][0], -block[1][0] / block.getDeterminant());
+}
