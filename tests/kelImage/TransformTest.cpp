@@ -105,6 +105,22 @@ TEST(LinearInterpolation, EnlargesByAnyRatio) {
     compare(resizeLinerInterpolation, kel_ref::linearInterpolation, {16, 16}, {16, 16}, 32, Guard::Behind, Fill::Random, 4);
 }
 
+// The pixel behind the source's last one is read as it is before the destination is written, also where it is the destination's.
+TEST(LinearInterpolation, EnlargesIntoMemoryRightBehindItsSource) {
+    Image both(32, 10, 16); // 16x4 pixels of source, then 32x8 of destination
+    const Bytes before = both.bytes();
+    Image apart(16, 4, 16, Guard::Behind, 4), expected(32, 8, 16);
+    apart.set(Bytes(before.begin(), before.begin() + static_cast<ptrdiff_t>(apart.size())));
+    kel_ref::linearInterpolation(expected.get(), apart.get());
+    kelImage_t *src = createKelImageHeader(16, 4, 16), *dst = createKelImageHeader(32, 8, 16);
+    src->data = both.data();
+    dst->data = both.data() + src->size;
+    resizeLinerInterpolation(dst, src);
+    EXPECT_EQ(Bytes(dst->data, dst->data + dst->size), expected.bytes());
+    releaseKelImageHeader(&src);
+    releaseKelImageHeader(&dst);
+}
+
 TEST(ZeroOrderHold, AveragesByAnyRatio) {
     for (Fill fill : {Fill::Random, Fill::Max, Fill::Alternating})
         for (int from : {1, 2, 3, 5, 8, 16, 17, 33, 64, 97})
