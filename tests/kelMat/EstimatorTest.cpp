@@ -575,6 +575,8 @@ TEST(Generator, DrawsItsValuesInArgumentOrder) {
     random.getMat(P);
     fixed.getMat(expected);
     EXPECT_TRUE(sameBits(P, expected));
+    random.setMatViewRandom(1, kNaN);
+    EXPECT_TRUE(std::isnan(random.matView[0][0])) << "bounds are swapped only where the first is larger";
 }
 
 // Real tentative matches, where a folder of them is named at configure time.
