@@ -1,4 +1,5 @@
 // Random integers over the platform's rand(); seeding it is the application's business.
+#include <stdint.h>
 #include <stdlib.h>
 
 #include "kelAssert.h"
@@ -12,10 +13,10 @@ int KEL_RAND(int x) {
 }
 
 int KEL_RAND_NORMAL(int x) {
-    int sum = 0;
+    int64_t sum = 0; // twelve draws of a large x do not fit into an int
     for (int draw = 0; draw < 12; ++draw)
-        sum += rand() % (x + 1);
-    return sum - 6 * x;
+        sum += rand() % (int64_t(x) + 1);
+    return static_cast<int>(sum - 6 * int64_t(x));
 }
 
 } // extern "C"

@@ -20,8 +20,12 @@ constexpr kelValue_s32 kAlignment = 16; // bytes of a vector, and pixels that `s
 
 void copyRows(unsigned char* dst, ptrdiff_t dstPitch, const unsigned char* src, ptrdiff_t srcPitch, size_t bytes,
               kelValue_s32 rows) {
-    if (rows > 0 && dstPitch == srcPitch && dstPitch == static_cast<ptrdiff_t>(bytes)) { // one run
-        bytes *= rows;
+    if (rows < 1)
+        return;
+    const size_t all = bytes * rows;
+    const bool apart = dst + all <= src || src + all <= dst; // else a row may be copied on as the row behind it
+    if (apart && dstPitch == srcPitch && dstPitch == static_cast<ptrdiff_t>(bytes)) { // one run
+        bytes = all;
         rows = 1;
     }
     for (kelValue_s32 y = 0; y < rows; ++y, dst += dstPitch, src += srcPitch)
@@ -72,11 +76,13 @@ kelImage_t* cloneKelImage(const kelImage_t* src) {
 }
 
 void copyKelImage(kelImage_t* dst, const kelImage_t* src) {
-    memcpy(dst->data, src->data, static_cast<size_t>(src->size));
+    if (src->size != 0)
+        memcpy(dst->data, src->data, static_cast<size_t>(src->size));
 }
 
 void clearKelImage(kelImage_t* image) {
-    memset(image->data, 0, static_cast<size_t>(image->size));
+    if (image->size != 0)
+        memset(image->data, 0, static_cast<size_t>(image->size));
 }
 
 void loadKelImageData(kelImage_t* image, const void* src, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch) {

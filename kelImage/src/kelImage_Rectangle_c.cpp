@@ -1,13 +1,17 @@
 // Rectangles between two corners (pp1), corner and size (ps1), and centre and size (ps2).
+#include <stdint.h>
+
 #include "kelImage.h"
 
 namespace {
 
-template <class T> void set(T* rectangle, T a, T b, T c, T d) {
-    rectangle[0] = a;
-    rectangle[1] = b;
-    rectangle[2] = c;
-    rectangle[3] = d;
+using Wide = int64_t; // of the integer forms: no sum or difference of two coordinates overflows
+
+template <class T, class Value> void set(T* rectangle, Value a, Value b, Value c, Value d) {
+    rectangle[0] = static_cast<T>(a);
+    rectangle[1] = static_cast<T>(b);
+    rectangle[2] = static_cast<T>(c);
+    rectangle[3] = static_cast<T>(d);
 }
 
 } // namespace
@@ -15,19 +19,20 @@ template <class T> void set(T* rectangle, T a, T b, T c, T d) {
 extern "C" {
 
 void kel_rectangle_translate_pp1_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src) {
-    set(dst, src[0], src[1], src[2] - src[0], src[3] - src[1]);
+    set<kelValue_s32, Wide>(dst, src[0], src[1], Wide(src[2]) - src[0], Wide(src[3]) - src[1]);
 }
 
 void kel_rectangle_translate_pp1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src) {
-    set(dst, (src[0] + src[2]) / 2, (src[1] + src[3]) / 2, src[2] - src[0], src[3] - src[1]);
+    set<kelValue_s32, Wide>(dst, (Wide(src[0]) + src[2]) / 2, (Wide(src[1]) + src[3]) / 2, Wide(src[2]) - src[0],
+                            Wide(src[3]) - src[1]);
 }
 
 void kel_rectangle_translate_ps1_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src) {
-    set(dst, src[0], src[1], src[0] + src[2], src[1] + src[3]);
+    set<kelValue_s32, Wide>(dst, src[0], src[1], Wide(src[0]) + src[2], Wide(src[1]) + src[3]);
 }
 
 void kel_rectangle_translate_ps1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src) {
-    set(dst, src[0] + src[2] / 2, src[1] + src[3] / 2, src[2], src[3]);
+    set<kelValue_s32, Wide>(dst, Wide(src[0]) + src[2] / 2, Wide(src[1]) + src[3] / 2, src[2], src[3]);
 }
 
 void kel_rectangle_translate_pp1_to_ps1_f32(float* dst, const float* src) {

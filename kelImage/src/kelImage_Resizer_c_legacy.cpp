@@ -93,6 +93,8 @@ template <class P> void decimateRow(P* dst, const P* src, ptrdiff_t width, ptrdi
 
 template <class P> void nearest(kelImage_t* dst, const kelImage_t* src) {
     const kelValue_s32 rx = src->width / dst->width, ry = src->height / dst->height;
+    if (dst->width < 0)
+        return;
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         P* const to = rowByWidth<P>(dst, y);
         const P* const from = rowByWidth<P>(src, sampleAt(y, static_cast<float>(ry)).index);
@@ -268,8 +270,8 @@ struct Ratio {
 };
 
 // Sums of bytes that are averaged over a box, and their division by it, rounding down. In 16 bits it is exact by a
-// multiplication with ceil(2^16 / box) as long as 255 * box * box < 2^16; larger boxes sum in 32 bits, and divide by
-// ceil(2^32 / box) as long as that, too, is exact.
+// multiplication with ceil(2^16 / box) as long as 255 * box * box < 2^16; larger boxes sum in 32 bits and multiply with
+// ceil(2^32 / box) as long as that, too, is exact; the largest sum in 64 bits and divide.
 constexpr int64_t kWordBox = 16, kReciprocalBox = 4103;
 
 // Two pixels as eight sums of 16 bits, for boxes up to kWordBox.
@@ -285,7 +287,7 @@ struct WordSums {
     }
 };
 
-// Two pixels as eight sums of 32 bits.
+// Two pixels as eight sums of 32 bits, for boxes up to kReciprocalBox.
 struct LongSums {
     struct Lanes {
         __m128i low, high;
@@ -300,21 +302,42 @@ struct LongSums {
     }
     static Lanes plus(Lanes a, Lanes b) { return {_mm_add_epi32(a.low, b.low), _mm_add_epi32(a.high, b.high)}; }
     static __m128i divided(__m128i sums, int64_t box) {
-        if (box <= kReciprocalBox) {
-            const __m128i magic = _mm_set1_epi32(static_cast<int>(((int64_t(1) << 32) + box - 1) / box));
-            const __m128i even = _mm_srli_epi64(_mm_mul_epu32(sums, magic), 32);
-            const __m128i odd = _mm_mul_epu32(_mm_srli_epi64(sums, 32), magic);
-            return _mm_blend_epi16(even, odd, 0xcc);
-        }
-        alignas(16) uint32_t sum[4];
-        store(sum, sums);
-        for (uint32_t& value : sum)
-            value /= static_cast<uint32_t>(box);
-        return load(sum);
+        const __m128i magic = _mm_set1_epi32(static_cast<int>(((int64_t(1) << 32) + box - 1) / box));
+        const __m128i even = _mm_srli_epi64(_mm_mul_epu32(sums, magic), 32);
+        const __m128i odd = _mm_mul_epu32(_mm_srli_epi64(sums, 32), magic);
+        return _mm_blend_epi16(even, odd, 0xcc);
     }
     static uint64_t average(Lanes sums, int64_t box) {
         const __m128i words = _mm_packus_epi32(divided(sums.low, box), divided(sums.high, box));
         return static_cast<uint64_t>(_mm_cvtsi128_si64(_mm_packus_epi16(words, words)));
+    }
+};
+
+// Two pixels as eight sums of 64 bits, for boxes of any size.
+struct AnySums {
+    struct Lanes {
+        uint64_t sum[8];
+    };
+    template <class Body> static Lanes each(Body body) {
+        Lanes result;
+        for (int i = 0; i < 8; ++i)
+            result.sum[i] = body(i);
+        return result;
+    }
+    static Lanes widened(uint64_t twoPixels) {
+        return each([=](int i) { return twoPixels >> (8 * i) & 0xff; });
+    }
+    static Lanes times(Lanes v, int64_t factor) {
+        return each([=](int i) { return v.sum[i] * static_cast<uint64_t>(factor); });
+    }
+    static Lanes plus(Lanes a, Lanes b) {
+        return each([=](int i) { return a.sum[i] + b.sum[i]; });
+    }
+    static uint64_t average(Lanes sums, int64_t box) {
+        uint64_t result = 0;
+        for (int i = 0; i < 8; ++i)
+            result |= sums.sum[i] / static_cast<uint64_t>(box) << (8 * i);
+        return result;
     }
 };
 
@@ -331,6 +354,16 @@ template <class Sums, class Input> uint64_t averageOf(const Box& box, const Rati
     if (box.first < box.last)
         sum = Sums::plus(sum, Sums::times(Sums::widened(input(box.last)), box.tail));
     return Sums::average(sum, ratio.box);
+}
+
+// Calls body(Sums()) for the cheapest sums that are exact for a box.
+template <class Body> void withSums(int64_t box, Body body) {
+    if (box <= kWordBox)
+        body(WordSums());
+    else if (box <= kReciprocalBox)
+        body(LongSums());
+    else
+        body(AnySums());
 }
 
 // (a + b) / 2 rounding down, byte by byte.
@@ -415,7 +448,7 @@ template <int N, class Image> auto borderRow(Image* image, kelValue_s32 y) {
 // far as the destination's data reaches. Callers rely on it.
 void rightBandByStep(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size) {
     Pixel<2>* const data = row<Pixel<2>>(dst, 0);
-    const ptrdiff_t end = dst->size / static_cast<ptrdiff_t>(sizeof(Pixel<2>));
+    const ptrdiff_t end = static_cast<ptrdiff_t>(dst->height) * dst->step; // `size` holds no 2^31 bytes
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         const ptrdiff_t begin = static_cast<ptrdiff_t>(y) * dst->step + src->step + size;
         for (ptrdiff_t i = begin; i < std::min(begin + size, end); ++i)
@@ -429,6 +462,8 @@ template <int N> void enborder(kelImage_t* dst, const kelImage_t* src, kelValue_
     if (width > 0 && height > 0)
         for (kelValue_s32 y = 0; y < dst->height; ++y)
             memcpy(borderRow<N>(dst, y) + size, borderRow<N>(src, std::min(std::max(y - size, 0), height - 1)), width * N);
+    if (size < 1)
+        return;
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         Pixel<N>* const to = borderRow<N>(dst, y);
         std::fill_n(to, size, to[size]);
@@ -456,7 +491,7 @@ void resizeKelImageBilinear(kelImage_t* dst, const kelImage_t* src) {
     const kelValue_s32 rx = src->width / dst->width, ry = src->height / dst->height;
     __asm__ volatile("" ::"r"(rx), "r"(ry)); // an empty destination divides by zero here, before any check
     KEL_ASSERT(dst->type == src->type);
-    if (dst->type != KEL_PIXEL_TYPE_U8G)
+    if (dst->type != KEL_PIXEL_TYPE_U8G || dst->width < 0)
         return;
     if (src->width < kExactSize && src->height < kExactSize)
         bilinearExact(dst, src, rx, ry);
@@ -477,6 +512,8 @@ void resizeKelImageHalf(kelImage_t* dst, const kelImage_t* src) {
 
 void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
     const Steps across(dst->width, src->width), down(dst->height, src->height);
+    if (dst->width < 0 || dst->height < 0)
+        return;
     const kelValue_s32 end = src->height - 1; // the row below the last one is the last one
     Buffer<uint32_t> above = allocate<uint32_t>(dst->width), below = allocate<uint32_t>(dst->width),
                      last = allocate<uint32_t>(dst->width);
@@ -505,22 +542,21 @@ void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
 void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src) {
     const Ratio across(dst->width, src->width), down(dst->height, src->height);
     if (across.isHalf() && down.isHalf() && dst->width % 4 == 0)
-        halveBothWays(dst, src);
-    else if (across.box <= kWordBox)
-        down.box <= kWordBox ? reduce<WordSums, WordSums>(dst, src, across, down)
-                             : reduce<WordSums, LongSums>(dst, src, across, down);
-    else
-        down.box <= kWordBox ? reduce<LongSums, WordSums>(dst, src, across, down)
-                             : reduce<LongSums, LongSums>(dst, src, across, down);
+        return halveBothWays(dst, src);
+    withSums(across.box, [&](auto acrossSums) {
+        withSums(down.box, [&](auto downSums) { reduce<decltype(acrossSums), decltype(downSums)>(dst, src, across, down); });
+    });
 }
 
-void resizeKelImageEnborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size) {
+void resizeKelImageEnborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 border) {
+    const ptrdiff_t size = border; // twice a border does not overflow
     KEL_ASSERT(dst->type == src->type);
     KEL_ASSERT(dst->width == src->width +2*size && dst->height == src->height + 2*size);
-    kel::withPixel(dst->type, [=](auto pixel) { enborder<sizeof(pixel)>(dst, src, size); });
+    kel::withPixel(dst->type, [=](auto pixel) { enborder<sizeof(pixel)>(dst, src, border); });
 }
 
-void resizeKelImageDeborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size) {
+void resizeKelImageDeborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 border) {
+    const ptrdiff_t size = border;
     KEL_ASSERT(dst->type == src->type);
     KEL_ASSERT(dst->width == src->width - 2*size && dst->height == src->height - 2*size);
     if (dst->width < 1)
@@ -528,7 +564,7 @@ void resizeKelImageDeborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32
     kel::withPixel(dst->type, [=](auto pixel) {
         using P = decltype(pixel);
         for (kelValue_s32 y = 0; y < dst->height; ++y)
-            memcpy(row<P>(dst, y), row<P>(src, y + size) + size, dst->width * sizeof(P));
+            memcpy(row<P>(dst, y), row<P>(src, y + border) + size, dst->width * sizeof(P));
     });
 }
 

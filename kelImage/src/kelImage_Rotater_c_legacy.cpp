@@ -90,19 +90,21 @@ void warpRow(Pixel<N>* to, ptrdiff_t width, float y, const Homography& homograph
     const float v = centred ? y + 0.5f : y;
     const Line top(homography.h, v), middle(homography.h + 3, v), bottom(homography.h + 6, v);
     const __m128i srcWidth = _mm_set1_epi32(src->width), srcHeight = _mm_set1_epi32(src->height);
-    const __m128i step = _mm_set1_epi32(src->step);
+    const __m128i step = _mm_set1_epi32(src->step), last = _mm_set1_epi32(static_cast<int>(width - 1));
+    const bool far = static_cast<int64_t>(src->step) * src->height > INT_MAX; // an int holds no index of its last pixels
     const Pixel<N>* const from = row<Pixel<N>>(src, 0);
     __m128i column = _mm_setr_epi32(0, 1, 2, 3);
     for (ptrdiff_t x = 0; x < width; x += 4, column = _mm_add_epi32(column, _mm_set1_epi32(4))) {
-        const __m128 corner = _mm_cvtepi32_ps(column);
+        // Behind the last column that one again: nothing is computed for columns that nobody asked for.
+        const __m128 corner = _mm_cvtepi32_ps(_mm_min_epi32(column, last));
         const __m128 u = centred ? _mm_add_ps(corner, _mm_set1_ps(0.5f)) : corner;
         const __m128 w = bottom.at(u);
         const __m128i sx = sourceIndex<centred>(top.at(u), w), sy = sourceIndex<centred>(middle.at(u), w);
         const __m128i inside = _mm_and_si128(inRange(sx, srcWidth), inRange(sy, srcHeight));
-        const __m128i element = _mm_and_si128(_mm_add_epi32(_mm_mullo_epi32(sy, step), sx), inside);
         const int mask = _mm_movemask_ps(_mm_castsi128_ps(inside));
         const int count = static_cast<int>(width - x < 4 ? width - x : 4);
-        if (mask == 0xf && count == 4) {
+        if (mask == 0xf && count == 4 && !far) {
+            const __m128i element = _mm_add_epi32(_mm_mullo_epi32(sy, step), sx);
             to[x] = from[_mm_cvtsi128_si32(element)];
             to[x + 1] = from[_mm_extract_epi32(element, 1)];
             to[x + 2] = from[_mm_extract_epi32(element, 2)];
@@ -110,10 +112,11 @@ void warpRow(Pixel<N>* to, ptrdiff_t width, float y, const Homography& homograph
         } else if (mask == 0 && count == 4) {
             memset(to + x, 0, 4 * N);
         } else {
-            alignas(16) int index[4];
-            _mm_store_si128(reinterpret_cast<__m128i*>(index), element);
+            alignas(16) int sourceX[4], sourceY[4];
+            _mm_store_si128(reinterpret_cast<__m128i*>(sourceX), sx);
+            _mm_store_si128(reinterpret_cast<__m128i*>(sourceY), sy);
             for (int i = 0; i < count; ++i)
-                to[x + i] = mask >> i & 1 ? from[index[i]] : Pixel<N>();
+                to[x + i] = mask >> i & 1 ? row<Pixel<N>>(src, sourceY[i])[sourceX[i]] : Pixel<N>();
         }
     }
 }

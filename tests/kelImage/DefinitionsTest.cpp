@@ -1,6 +1,7 @@
 // Rectangles, colour tables, random helpers.
 #include <algorithm>
 #include <array>
+#include <climits>
 #include <cmath>
 #include <cstdlib>
 #include <gtest/gtest.h>
@@ -31,6 +32,8 @@ TEST(Rectangle, TranslatesCornersSizesAndCentres) {
     EXPECT_EQ(translated(kel_rectangle_translate_pp1_to_ps1_s32, {2, 3, 12, 8}), (Ints{2, 3, 10, 5}));
     EXPECT_EQ(translated(kel_rectangle_translate_pp1_to_ps2_s32, {2, 3, 12, 8}), (Ints{7, 5, 10, 5}));
     EXPECT_EQ(translated(kel_rectangle_translate_pp1_to_ps2_s32, {-3, 0, 0, 1}), (Ints{-1, 0, 3, 1}));
+    EXPECT_EQ(translated(kel_rectangle_translate_pp1_to_ps2_s32, {INT_MAX, INT_MIN, INT_MAX, INT_MIN}),
+              (Ints{INT_MAX, INT_MIN, 0, 0}));
     EXPECT_EQ(translated(kel_rectangle_translate_ps1_to_pp1_s32, {2, 3, 10, 5}), (Ints{2, 3, 12, 8}));
     EXPECT_EQ(translated(kel_rectangle_translate_ps1_to_ps2_s32, {-3, 0, 3, 1}), (Ints{-2, 0, 3, 1}));
     EXPECT_EQ(translated(kel_rectangle_translate_ps1_to_ps2_s32, {0, 0, -3, -1}), (Ints{-1, 0, -3, -1}));
@@ -72,11 +75,11 @@ TEST(Random, DrawsFromRandInOrder) {
     EXPECT_EQ(KEL_RAND(7), second % 7);
     EXPECT_EQ(KEL_RAND(1), 0);
 
-    for (int x : {0, 1, 10, 1000}) {
+    for (int x : {0, 1, 10, 1000, 357913941}) {
         srand(9);
-        int sum = -6 * x;
+        int64_t sum = -6 * int64_t(x);
         for (int i = 0; i < 12; ++i)
-            sum += rand() % (x + 1);
+            sum += rand() % (int64_t(x) + 1);
         const int next = rand();
         srand(9);
         EXPECT_EQ(KEL_RAND_NORMAL(x), sum);

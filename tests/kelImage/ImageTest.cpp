@@ -126,6 +126,24 @@ TEST(ImageData, LoadsAndStoresTheCommonCornerOnly) {
                 }
 }
 
+// Rows are copied one after the other, so that the first of them runs on where each row's copy is the next row's source.
+TEST(ImageData, CopiesRowByRowWithinOneBlock) {
+    for (bool load : {true, false}) {
+        Image block(16, 9, 0);
+        Bytes expected = block.bytes();
+        for (int y = 1; y < 9; ++y)
+            std::copy_n(expected.begin(), 16, expected.begin() + 16 * y);
+        kelImage_t* view = createKelImageHeader(16, 8, 0);
+        view->data = block.data() + (load ? 16 : 0);
+        if (load)
+            loadKelImageData(view, block.data(), 16, 8, 16);
+        else
+            storeKelImageData(block.data() + 16, 16, 8, 16, view);
+        EXPECT_TRUE(holds(block, expected));
+        releaseKelImageHeader(&view);
+    }
+}
+
 TEST(ImageData, FileEntryPointsAreInert) {
     EXPECT_EQ(loadKelImage("no such file"), nullptr);
     storeKelImage("no such file", nullptr);

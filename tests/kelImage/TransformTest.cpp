@@ -1,4 +1,5 @@
 // Resizing, borders, flips and warp against plain references, byte for byte, padding and neighbours included.
+#include <cfenv>
 #include <cmath>
 #include <functional>
 #include <limits>
@@ -89,6 +90,7 @@ TEST(Bilinear, AveragesNeighboursAtWholeRatiosByWidth) {
     compare(resizeKelImageBilinear, kel_ref::bilinear, {31, 16}, {31, 17}, 0);
     compare(resizeKelImageBilinear, kel_ref::bilinear, {4200000, 1}, {12600001, 1}, 0);
     compare(resizeKelImageBilinear, kel_ref::bilinear, {6000000, 1}, {18000001, 1}, 0);
+    compare(resizeKelImageBilinear, kel_ref::bilinear, {1400001, 1}, {4200004, 3}, 0);
     compare(resizeKelImageBilinear, kel_ref::bilinear, {5, 3}, {15, 9}, KEL_PIXEL_TYPE_U8XYZ);
 }
 
@@ -138,6 +140,17 @@ TEST(ZeroOrderHold, AveragesByAnyRatio) {
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 1}, {4099, 2}, 32);
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {3, 1}, {4106, 1}, 32);
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 2}, {2, 9001}, 32, Guard::Behind, Fill::Max);
+}
+
+// The sum of a box does not fit into 32 bits.
+TEST(ZeroOrderHold, AveragesOverHugeBoxes) {
+    const std::vector<uint32_t> white(16900000, 0xffffffffu);
+    kelImage_t *src = createKelImageHeader(16900000, 1, 16), *dst = createKelImage(1, 1, 16);
+    src->data = const_cast<unsigned char*>(reinterpret_cast<const unsigned char*>(white.data()));
+    zero_order_hold_plus_ave(dst, src);
+    EXPECT_EQ(Bytes(dst->data, dst->data + 4), Bytes(4, 255));
+    releaseKelImageHeader(&src);
+    releaseKelImage(&dst);
 }
 
 TEST(Border, ReplicatesEdgesAndCropsThemAgain) {
@@ -211,6 +224,32 @@ TEST(Warp, SamplesAsTheReferenceDoesForAnyHomography) {
                             {40 - width, 17}, type, guard);
 }
 
+// An int holds no index of the last pixels. Nothing but the pixels touched is ever in memory.
+TEST(Warp, SamplesSourcesOfMoreThanTwoGigapixels) {
+    kelImage_t* const src = createKelImageHeader(65536, 40000, 0);
+    const size_t bytes = size_t(65536) * 40000;
+    void* const block = mmap(nullptr, bytes, PROT_READ | PROT_WRITE, MAP_PRIVATE | MAP_ANONYMOUS | MAP_NORESERVE, -1, 0);
+    ASSERT_NE(block, MAP_FAILED);
+    src->data = static_cast<unsigned char*>(block);
+    std::fill_n(src->data + bytes - 9, 9, 77);
+    Image dst(9, 1, 0);
+    const float toTheLastRow[9] = {1, 0, 65536 - 9, 0, 1, 39999, 0, 0, 1};
+    warpBy(dst.get(), src, toTheLastRow);
+    EXPECT_EQ(Bytes(dst.data(), dst.data() + 9), Bytes(9, 77));
+    munmap(block, bytes);
+    kelImage_t* record = src;
+    releaseKelImageHeader(&record);
+}
+
+// The denominator is 0 one column behind the last.
+TEST(Warp, ComputesNoColumnBehindTheLast) {
+    Image src(4, 1, 16), dst(1, 1, 16);
+    const float pole[9] = {1, 0, 0, 0, 1, 0, 1, 0, -1};
+    std::feclearexcept(FE_ALL_EXCEPT);
+    warpBy(dst.get(), src.get(), pole);
+    EXPECT_FALSE(std::fetestexcept(FE_DIVBYZERO));
+}
+
 TEST(Warp, FillsWithZeroFromAnEmptySource) {
     Image src(0, 0, 0), dst(20, 3, 0);
     const float identity[9] = {1, 0, 0, 0, 1, 0, 0, 0, 1};
@@ -219,6 +258,31 @@ TEST(Warp, FillsWithZeroFromAnEmptySource) {
         std::fill_n(expected.begin() + 32 * y, 20, 0);
     warpBy(dst.get(), src.get(), identity);
     EXPECT_TRUE(holds(dst, expected));
+}
+
+// A destination of more than 2^31 bytes says a size that has wrapped.
+TEST(Border, OfWordsReachesAsFarAsRowsAndStepSay) {
+    Image src(16, 3, 3), dst(18, 5, 3), expected(18, 5, 3);
+    expected.set(dst.bytes());
+    kel_ref::enborder(expected.get(), src.get(), 1);
+    dst->size = -dst->size;
+    resizeKelImageEnborder(dst.get(), src.get(), 1);
+    EXPECT_TRUE(holds(dst, expected.bytes()));
+}
+
+TEST(Transforms, WriteNothingForNegativeWidths) {
+    for (int type : {0, 16}) {
+        Image memory(16, 8, type);
+        const Bytes before = memory.bytes();
+        kelImage_t *src = createKelImageHeader(-5, 4, type), *dst = createKelImageHeader(-5, 4, type);
+        src->data = dst->data = memory.data() + 64;
+        for (auto resize : {resizeKelImageNearest, resizeKelImageBilinear, resizeLinerInterpolation, zero_order_hold_plus_ave})
+            if (type == 16 || resize == resizeKelImageNearest || resize == resizeKelImageBilinear)
+                resize(dst, src);
+        EXPECT_TRUE(holds(memory, before));
+        releaseKelImageHeader(&src);
+        releaseKelImageHeader(&dst);
+    }
 }
 
 TEST(Transforms, IgnoreTypesThatTheyDoNotHandle) {
