@@ -183,20 +183,20 @@ kelMat kelMat::operator/(float v) const {
 
 kelMat kelMat::operator+(const kelMat& M) const {
     if (!bothCreated(*this, M))
-        return kelMat(0, 0, true);
+        return kelMat();
     KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
     return elementwise(*this, M, [](float a, float b) { return a + b; });
 }
 
 kelMat kelMat::operator-(const kelMat& M) const {
     if (!bothCreated(*this, M))
-        return kelMat(0, 0, true);
+        return kelMat();
     KEL_ASSERT(this->m_Width == M.m_Width && this->m_Height == M.m_Height);
     return elementwise(*this, M, [](float a, float b) { return a - b; });
 }
 
 kelMat kelMat::operator*(const kelMat& M) const {
-    kelMat R(0, 0, true);
+    kelMat R;
     if (!bothCreated(*this, M))
         return R;
     KEL_ASSERT(this->m_Width == M.m_Height);
@@ -206,7 +206,7 @@ kelMat kelMat::operator*(const kelMat& M) const {
 }
 
 kelMat kelMat::operator|(const kelMat& M) const {
-    kelMat R(0, 0, true);
+    kelMat R;
     if (!bothCreated(*this, M))
         return R;
     KEL_ASSERT(this->m_Height == M.m_Height);
@@ -231,7 +231,7 @@ bool kelMat::getTransposedMatrix(kelMat& T) const {
 }
 
 kelMat kelMat::getTransposedMatrix() const {
-    kelMat T(0, 0, true);
+    kelMat T;
     getTransposedMatrix(T);
     return T;
 }
@@ -492,20 +492,22 @@ bool kelMat::getAngleFromRotationMatrix_ZZYX_3x3(float& t, float& p, float& q) {
     constexpr double kNoTilt = 1e-6;
     const kelMat& R = *this;
     const bool upsideDown = R[2][2] < -1.0f;
+    float azimuth = 0.0f, roll; // outputs last: they may be elements of the matrix
     const float tilt = R[2][2] > 1.0f ? 0.0f : upsideDown ? kPi : acosf(R[2][2]);
     if (static_cast<double>(fabsf(tilt)) < kNoTilt) {
+        roll = saturatedAngleOf(R[1][0], R[0][0]);
         t = 0.0f;
-        p = 0.0f;
-        q = degrees(saturatedAngleOf(R[1][0], R[0][0]));
-        return true;
+    } else {
+        const float sine = upsideDown ? kSineOfPi : sinf(tilt);
+        const float horizontal = R[0][2] * R[0][2] + R[1][2] * R[1][2];
+        const float cosineRoll = -(R[0][2] * R[2][0] + R[1][2] * R[2][1]) / horizontal;
+        const float sineRoll = (R[2][1] * R[0][2] - R[2][0] * R[1][2]) / horizontal;
+        azimuth = saturatedAngleOf(R[1][2] / sine, R[0][2] / sine);
+        roll = saturatedAngleOf(sineRoll, cosineRoll);
+        t = degrees(tilt);
     }
-    const float sine = upsideDown ? kSineOfPi : sinf(tilt);
-    const float horizontal = R[0][2] * R[0][2] + R[1][2] * R[1][2];
-    const float cosineRoll = -(R[0][2] * R[2][0] + R[1][2] * R[2][1]) / horizontal;
-    const float sineRoll = (R[2][1] * R[0][2] - R[2][0] * R[1][2]) / horizontal;
-    t = degrees(tilt);
-    p = degrees(saturatedAngleOf(R[1][2] / sine, R[0][2] / sine));
-    q = degrees(saturatedAngleOf(sineRoll, cosineRoll));
+    p = degrees(azimuth);
+    q = degrees(roll);
     return true;
 }
 
@@ -597,18 +599,16 @@ bool kelMat::getDecomposedMatrix_ART_3x3(kelMat& A, kelMat& R, kelMat& T) const 
 bool kelMat::getDecomposedMatrix_LU(kelMat& L, kelMat& U) const {
     KEL_ASSERT(this->m_Width == this->m_Height);
     const int n = m_Width;
-    kel::Scratch<int, kel::kSmallOrder> indx(n);
-    kel::SmallMat both(*this);
-    float parity;
-    const bool ok = nr_ludcmp(both, indx.data(), &parity);
+    kel::LUCopy lu(*this);
     L.create(n, n, true);
     L.setDataIdentity(1.0f);
     U.create(n, n, true);
-    for (int r = 0; r < n; ++r) {
-        std::copy_n(both[r], r, L[r]);
-        std::copy(both[r] + r, both[r] + n, U[r] + r);
+    const float* row = lu.a.data();
+    for (int r = 0; r < n; ++r, row += n) {
+        std::copy_n(row, r, L[r]);
+        std::copy(row + r, row + n, U[r] + r);
     }
-    return ok;
+    return lu.ok;
 }
 
 bool kelMat::getDecomposedrixMat_QR(kelMat&, kelMat&) const {
@@ -620,26 +620,41 @@ bool kelMat::getDecomposedMatrix_SV(kelMat& U, kelMat& W, kelMat& V) const {
 }
 
 bool kelMat::getEigenValue(kelMat& d, kelMat& v) {
-    kel::SmallMat copy(*this);
+    const int n = m_Width;
+    kel::SquareScratch copy(elements(*this));
+    std::copy_n(m_Data, elements(*this), copy.data());
     int rotations;
-    nr_jacobi(copy, d, v, &rotations);
+    d.create(n, 1, false);
+    v.create(n, n, false);
+    kel::jacobi(copy.data(), n, d.m_Data, v.m_Data, &rotations);
     return true;
 }
 
 // With B = L L^T the problem becomes C y = lambda y, C = L^-1 A L^-T, and x = L^-T y.
 bool kelMat::getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X) {
-    const kelMat& A = *this;
-    kel::SmallMat L(B);
-    nr_choldc(L);
-    kel::SmallMat U(L.m_Width, L.m_Height);
-    kel::transpose(U.m_Data, L.m_Data, L.m_Height, L.m_Width);
-    const kelMat M = U.getInversedMatrix(); // empty, as all that follows, where B has no factor with an inverse
-    kel::SmallMat N(M.m_Width, M.m_Height);
-    kel::transpose(N.m_Data, M.m_Data, M.m_Height, M.m_Width);
-    kelMat C = N * A * M, Y;
+    const int n = B.m_Width;
+    if (B.m_Height != n || n < 2)
+        B.getInversedMatrix(); // stops the process on the size
+    if (m_Height != n || m_Width != n)
+        (void)(kelMat(n, n) * *this * kelMat(n, n)); // so does this, if there is a matrix at all
+    const size_t square = elements(B);
+    kel::SquareScratch L(square), M(square), N(square), C(square);
+    std::copy_n(B.m_Data, square, L.data());
+    kel::decomposeCholesky(L.data(), n);
+    kel::transpose(C.data(), L.data(), n, n);
+    if (!m_IsCreated || !kel::invert(C.data(), n, M.data())) {
+        d.release();
+        X.release();
+        return true;
+    }
+    kel::transpose(N.data(), M.data(), n, n);
+    kel::multiply(L.data(), N.data(), m_Data, n, n, n);
+    kel::multiply(C.data(), L.data(), M.data(), n, n, n);
     int rotations;
-    nr_jacobi(C, d, Y, &rotations);
-    X = M * Y;
+    d.create(n, 1, false);
+    kel::jacobi(C.data(), n, d.m_Data, N.data(), &rotations);
+    X.create(n, n, false);
+    kel::multiply(X.m_Data, M.data(), N.data(), n, n, n);
     return true;
 }
 
@@ -672,7 +687,7 @@ bool kelMat::getInversedMatrix(kelMat& R) const {
 }
 
 kelMat kelMat::getInversedMatrix() const {
-    kelMat R(0, 0, true);
+    kelMat R;
     getInversedMatrix(R);
     return R;
 }
@@ -682,7 +697,7 @@ bool kelMat::getInversedMatrix_Pseudo(kelMat& R) const {
 }
 
 kelMat kelMat::getInversedMatrix_Pseudo() const {
-    kelMat R(0, 0, true);
+    kelMat R;
     getInversedMatrix_Pseudo(R);
     return R;
 }

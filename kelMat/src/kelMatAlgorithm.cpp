@@ -88,10 +88,10 @@ namespace {
 constexpr float kTinyPivot = 1.0e-40f;
 
 // The reciprocal of the largest magnitude of each row; false for a row of zeros.
-bool rowScales(const float* a, int n, float* scales) {
-    for (int i = 0; i < n; ++i, a += n) {
+bool rowScales(const float* a, ptrdiff_t n, float* scales) {
+    for (ptrdiff_t i = 0; i < n; ++i, a += n) {
         float largest = 0.0f;
-        for (int j = 0; j < n; ++j)
+        for (ptrdiff_t j = 0; j < n; ++j)
             if (const float magnitude = fabsf(a[j]); magnitude > largest)
                 largest = magnitude;
         if (largest == 0.0f)
@@ -101,75 +101,105 @@ bool rowScales(const float* a, int n, float* scales) {
     return true;
 }
 
-// Picks the pivot of column j among the rows from j on, the last of equals, and brings it to its place; a column without a
-// candidate (all NaN) takes over the row of the column before. Then divides the column below by the pivot.
-void pivot(float* a, int n, int j, float* scales, int* row, int* indx, float* d) {
-    float best = 0.0f;
-    for (int i = j; i < n; ++i) {
-        const float candidate = scales[i] * fabsf(a[i * n + j]);
-        if (candidate >= best) {
-            best = candidate;
-            *row = i;
+// A matrix in the course of its decomposition: columns before the current one are finished.
+struct LU {
+    float* const a;
+    const ptrdiff_t n;
+    float* const scales;
+    int* const indx;
+    float* const parity;
+    ptrdiff_t pivotRow = 0; // the last one picked
+
+    float* row(ptrdiff_t i) const { return a + i * n; }
+
+    // Picks the pivot of column j among the rows from j on, the last of equals, and brings it to its place; a column without a
+    // candidate (all NaN) takes over the row of the column before. Then divides the column below by the pivot.
+    void pivot(ptrdiff_t j) {
+        float best = 0.0f;
+        for (ptrdiff_t i = j; i < n; ++i) {
+            const float candidate = scales[i] * fabsf(row(i)[j]);
+            if (candidate >= best) {
+                best = candidate;
+                pivotRow = i;
+            }
+        }
+        if (pivotRow != j) {
+            std::swap_ranges(row(pivotRow), row(pivotRow + 1), row(j));
+            *parity = -*parity;
+            scales[pivotRow] = scales[j];
+        }
+        indx[j] = static_cast<int>(pivotRow);
+        float& diagonal = row(j)[j];
+        if (diagonal == 0.0f)
+            diagonal = kTinyPivot;
+        const float reciprocal = 1.0f / diagonal;
+        for (ptrdiff_t i = j + 1; i < n; ++i)
+            row(i)[j] *= reciprocal;
+    }
+
+    // Crout's order from column `first` on: a column gets the products of the columns before it when its turn comes.
+    void finishByColumns(ptrdiff_t first) {
+        for (ptrdiff_t j = first; j < n; ++j) {
+            for (ptrdiff_t i = 1; i < n; ++i)
+                for (ptrdiff_t k = 0; k < std::min(i, j); ++k)
+                    row(i)[j] -= row(i)[k] * row(k)[j];
+            pivot(j);
         }
     }
-    if (*row != j) {
-        std::swap_ranges(a + *row * n, a + (*row + 1) * n, a + j * n);
-        *d = -*d;
-        scales[*row] = scales[j];
-    }
-    indx[j] = *row;
-    float& diagonal = a[j * n + j];
-    if (diagonal == 0.0f)
-        diagonal = kTinyPivot;
-    const float reciprocal = 1.0f / diagonal;
-    for (int i = j + 1; i < n; ++i)
-        a[i * n + j] *= reciprocal;
-}
 
-// Crout's order: a column gets the products of the columns before it when its turn comes.
-void decomposeByColumns(float* a, int n, float* scales, int* indx, float* d) {
-    for (int j = 0, row = 0; j < n; ++j) {
-        for (int i = 1; i < n; ++i)
-            for (int k = 0; k < std::min(i, j); ++k)
-                a[i * n + j] -= a[i * n + k] * a[k * n + j];
-        pivot(a, n, j, scales, &row, indx, d);
+    // The same sums for a panel of columns at once: first the products of all columns before it, row by row, then those of its
+    // own columns, each as soon as it is finished. That is the same as long as no row that is finished returns as a pivot, which
+    // takes a column of NaN; then false, and the columns after that one, whose number goes to `finished`, as they came in.
+    // `before` has room for the panel.
+    bool takePanel(ptrdiff_t begin, ptrdiff_t width, float* before, ptrdiff_t* finished) {
+        for (ptrdiff_t i = 0; i < n; ++i)
+            std::copy_n(row(i) + begin, width, before + i * width);
+        for (ptrdiff_t i = 1; begin > 0 && i < n; ++i)
+            for (ptrdiff_t k = 0; k < std::min(i, begin); ++k)
+                kel::subtractMultiple(row(i) + begin, row(i)[k], row(k) + begin, width);
+        for (ptrdiff_t j = begin; j < begin + width; ++j) {
+            pivot(j);
+            if (pivotRow != j)
+                std::swap_ranges(before + pivotRow * width, before + (pivotRow + 1) * width, before + j * width);
+            if (pivotRow < j) {
+                for (ptrdiff_t i = 0; i < n; ++i)
+                    std::copy(before + i * width + (j + 1 - begin), before + (i + 1) * width, row(i) + j + 1);
+                *finished = j + 1;
+                return false;
+            }
+            for (ptrdiff_t i = j + 1; i < n; ++i)
+                kel::subtractMultiple(row(i) + j + 1, row(i)[j], row(j) + j + 1, begin + width - j - 1);
+        }
+        return true;
     }
-}
-
-// The same sums row by row: each pivot row is subtracted from all rows below it at once. That is the same as long as no row
-// that is finished returns as a pivot, which takes a column of NaN; false then.
-bool decomposeByRows(float* a, int n, float* scales, int* indx, float* d) {
-    for (int j = 0, row = 0; j < n; ++j) {
-        pivot(a, n, j, scales, &row, indx, d);
-        if (row < j)
-            return false;
-        for (int i = j + 1; i < n; ++i)
-            kel::subtractMultiple(a + i * n + j + 1, a[i * n + j], a + j * n + j + 1, n - j - 1);
-    }
-    return true;
-}
+};
 
 } // namespace
 
-bool nr_ludcmp(kelMat& a, int* indx, float* d) {
-    const int n = a.m_Width;
-    *d = 1.0f;
-    kel::Scratch<float, kel::kSmallOrder> scales(n);
-    if (!rowScales(a.m_Data, n, scales.data()))
-        return false;
-    kel::SmallMat before(a);
-    if (decomposeByRows(a.m_Data, n, scales.data(), indx, d))
+bool kel::decomposeLU(float* a, int n, int* indx, float* parity) {
+    constexpr ptrdiff_t kPanel = 32;
+    *parity = 1.0f;
+    if (n < 1)
         return true;
-    *d = 1.0f;
-    a.setData(before.m_Data);
-    rowScales(a.m_Data, n, scales.data());
-    decomposeByColumns(a.m_Data, n, scales.data(), indx, d);
+    kel::Scratch<float, kel::kSmallOrder> scales(n);
+    if (!rowScales(a, n, scales.data()))
+        return false;
+    kel::SquareScratch before(n * std::min<ptrdiff_t>(n, kPanel));
+    LU lu = {a, n, scales.data(), indx, parity};
+    for (ptrdiff_t begin = 0, finished; begin < n; begin += kPanel)
+        if (!lu.takePanel(begin, std::min(n - begin, kPanel), before.data(), &finished)) {
+            lu.finishByColumns(finished);
+            break;
+        }
     return true;
 }
 
-bool nr_lubksb(kelMat& a, int* indx, float* b) {
-    const int n = a.m_Width;
-    const float* row = a.m_Data;
+bool nr_ludcmp(kelMat& a, int* indx, float* d) {
+    return kel::decomposeLU(a.m_Data, a.m_Width, indx, d);
+}
+
+void kel::substituteLU(const float* lu, int n, const int* indx, float* b) {
+    const float* row = lu;
     int first = -1; // the first element of b that is not zero, once met
     for (int i = 0; i < n; ++i, row += n) {
         float sum = b[indx[i]];
@@ -188,42 +218,61 @@ bool nr_lubksb(kelMat& a, int* indx, float* b) {
             sum -= row[k] * b[k];
         b[i] = sum / row[i];
     }
+}
+
+bool nr_lubksb(kelMat& a, int* indx, float* b) {
+    kel::substituteLU(a.m_Data, a.m_Width, indx, b);
     return true;
 }
 
 // ---- Cholesky --------------------------------------------------------------------------------------------------------------
 
 // First L D L^T with the products D L^T kept in the lower triangle, then every column divided by the root of its pivot.
-bool nr_choldc(kelMat& a) {
-    const int n = a.m_Width;
-    float* const A = a.m_Data;
-    for (int i = 0; i < n; ++i) {
-        float* const row = A + i * n;
-        for (int j = 0; j <= i; ++j) {
-            const float* const other = A + j * n;
+bool kel::decomposeCholesky(float* a, int order) {
+    const ptrdiff_t n = order;
+    for (ptrdiff_t i = 0; i < n; ++i) {
+        float* const row = a + i * n;
+        for (ptrdiff_t j = 0; j <= i; ++j) {
+            const float* const other = a + j * n;
             float sum = row[j];
-            for (int k = 0; k < j; ++k)
-                sum -= row[k] * other[k] / A[k * n + k];
+            for (ptrdiff_t k = 0; k < j; ++k)
+                sum -= row[k] * other[k] / a[k * n + k];
             if (j == i && 0.0f >= sum)
                 return false;
             row[j] = sum;
         }
     }
-    for (int i = 0; i < n; ++i)
-        A[i * n + i] = sqrtf(A[i * n + i]);
-    for (int i = 0; i < n; ++i) {
-        for (int j = 0; j < i; ++j)
-            A[i * n + j] /= A[j * n + j];
-        std::fill(A + i * n + i + 1, A + (i + 1) * n, 0.0f);
+    for (ptrdiff_t i = 0; i < n; ++i)
+        a[i * n + i] = sqrtf(a[i * n + i]);
+    for (ptrdiff_t i = 0; i < n; ++i) {
+        for (ptrdiff_t j = 0; j < i; ++j)
+            a[i * n + j] /= a[j * n + j];
+        std::fill(a + i * n + i + 1, a + (i + 1) * n, 0.0f);
     }
     return true;
+}
+
+bool nr_choldc(kelMat& a) {
+    return kel::decomposeCholesky(a.m_Data, a.m_Width);
 }
 
 // ---- singular values -------------------------------------------------------------------------------------------------------
 
 bool nr_svdcmp(const kelMat& a, kelMat& u, kelMat& w, kelMat& v) {
-    u.create(a.m_Height, a.m_Width, false);
-    return kel::decompose(a.m_Data, u, true, w, v);
+    const int m = a.m_Height, n = a.m_Width;
+    const bool goes = &w == &a || &v == &a; // with the outputs below
+    if (goes)
+        u = a;
+    else if (&u != &a)
+        u.create(m, n, false);
+    const float* const from = goes ? u.m_Data : a.m_Data;
+    w.create(n, n, true);
+    v.create(n, n, false);
+    kel::Scratch<float, kel::kSmallOrder> values(n);
+    const bool converged = kel::decomposeSV(from, m, n, u.m_Data, true, values.data(), v.m_Data);
+    for (int i = 0; i < n; ++i)
+        w[i][i] = values[i];
+    return converged;
 }
 
 // ---- symmetric eigenvalues -------------------------------------------------------------------------------------------------
@@ -404,13 +453,17 @@ private:
 
 } // namespace
 
+bool kel::jacobi(float* a, int n, float* d, float* v, int* rotations) {
+    *rotations = 0;
+    Jacobi iteration(a, n, d);
+    const bool converged = iteration.run(rotations);
+    iteration.store(a, v);
+    return converged;
+}
+
 bool nr_jacobi(kelMat& a, kelMat& d, kelMat& v, int* nrot) {
     const int n = a.m_Width;
-    d.create(n, 1, true);
+    d.create(n, 1, false);
     v.create(n, n, false);
-    *nrot = 0;
-    Jacobi jacobi(a.m_Data, n, d.m_Data);
-    const bool converged = jacobi.run(nrot);
-    jacobi.store(a.m_Data, v.m_Data);
-    return converged;
+    return kel::jacobi(a.m_Data, n, d.m_Data, v.m_Data, nrot);
 }

@@ -4,33 +4,22 @@
 
 #include "kelMat_Private.h"
 
-bool kel_getInversedMatrix_2x2(const kelMat& A, kelMat& R) {
-    const float det = A.getDeterminant();
-    if (det == 0.0f)
-        return false;
-    const float *const a = A[0], *const b = A[1];
+namespace {
+
+// The adjugate over the determinant, from the rows of the matrix.
+void invert2x2(const float* a, const float* b, float det, float* R) {
     const float inverse[] = {b[1] / det, -a[1] / det, -b[0] / det, a[0] / det};
-    R.create(2, 2, false);
-    std::copy_n(inverse, 4, R.m_Data);
-    return true;
+    std::copy_n(inverse, 4, R);
 }
 
-bool kel_getInversedMatrix_3x3(const kelMat& A, kelMat& R) {
-    const float det = A.getDeterminant();
-    if (det == 0.0f)
-        return false;
-    const float *const a = A[0], *const b = A[1], *const c = A[2];
+void invert3x3(const float* a, const float* b, const float* c, float det, float* R) {
     const float inverse[] = {
         (b[1] * c[2] - b[2] * c[1]) / det, (c[1] * a[2] - c[2] * a[1]) / det, (a[1] * b[2] - a[2] * b[1]) / det,
         (b[2] * c[0] - b[0] * c[2]) / det, (c[2] * a[0] - c[0] * a[2]) / det, (a[2] * b[0] - a[0] * b[2]) / det,
         (b[0] * c[1] - b[1] * c[0]) / det, (c[0] * a[1] - c[1] * a[0]) / det, (a[0] * b[1] - a[1] * b[0]) / det,
     };
-    R.create(3, 3, false);
-    std::copy_n(inverse, 9, R.m_Data);
-    return true;
+    std::copy_n(inverse, 9, R);
 }
-
-namespace {
 
 // Solves LU X = P for all columns of the identity at once; `indx` holds the row swaps P.
 void solveIdentity(const float* LU, const int* indx, ptrdiff_t n, float* X) {
@@ -51,11 +40,6 @@ void solveIdentity(const float* LU, const int* indx, ptrdiff_t n, float* X) {
     }
 }
 
-bool isFinite(const kelMat& A) {
-    return std::all_of(A.m_Data, A.m_Data + static_cast<ptrdiff_t>(A.m_Height) * A.m_Width,
-                       [](float x) { return std::isfinite(x); });
-}
-
 // Whether no row was swapped with one above it, as a column without a candidate (all NaN) may have it.
 bool swapsDownward(const int* indx, int n) {
     for (int i = 0; i < n; ++i)
@@ -66,39 +50,80 @@ bool swapsDownward(const int* indx, int n) {
 
 } // namespace
 
-bool kel_getInversedMatrix_NxN(const kelMat& A, kelMat& R) {
-    const int n = A.m_Width;
-    kel::Scratch<int, kel::kSmallOrder> indx(n);
-    kel::SmallMat LU(A);
-    float parity;
-    if (!nr_ludcmp(LU, indx.data(), &parity))
-        return false;
-    R.create(n, n, false);
-    if (isFinite(LU) && swapsDownward(indx.data(), n)) {
-        solveIdentity(LU.m_Data, indx.data(), n, R.m_Data);
-        return true;
-    }
-    // One by one: nr_lubksb() skips the leading zeros of each column, which matters to infinities and to swaps upward.
+void kel::invertLU(const float* lu, int n, const int* indx, float* R) {
+    const float* const end = lu + static_cast<ptrdiff_t>(n) * n;
+    if (std::all_of(lu, end, [](float x) { return std::isfinite(x); }) && swapsDownward(indx, n))
+        return solveIdentity(lu, indx, n, R);
+    // One by one: the leading zeros of each column are skipped, which matters to infinities and to swaps upward.
     kel::Scratch<float, kel::kSmallOrder> column(n);
     for (int j = 0; j < n; ++j) {
         std::fill_n(column.data(), n, 0.0f);
         column[j] = 1.0f;
-        nr_lubksb(LU, indx.data(), column.data());
+        substituteLU(lu, n, indx, column.data());
         for (ptrdiff_t i = 0; i < n; ++i)
-            R.m_Data[i * n + j] = column[i];
+            R[i * n + j] = column[i];
     }
+}
+
+bool kel::invert(float* a, int n, float* R) {
+    if (n <= 3) {
+        const float det = n == 2 ? determinant2x2(a, a + 2) : determinant3x3(a, a + 3, a + 6);
+        if (det == 0.0f)
+            return false;
+        n == 2 ? invert2x2(a, a + 2, det, R) : invert3x3(a, a + 3, a + 6, det, R);
+        return true;
+    }
+    Scratch<int, kSmallOrder> indx(n);
+    float parity;
+    if (!decomposeLU(a, n, indx.data(), &parity))
+        return false;
+    invertLU(a, n, indx.data(), R);
+    return true;
+}
+
+bool kel_getInversedMatrix_2x2(const kelMat& A, kelMat& R) {
+    const float det = A.getDeterminant();
+    if (det == 0.0f)
+        return false;
+    float inverse[4];
+    invert2x2(A[0], A[1], det, inverse);
+    R.create(2, 2, false);
+    std::copy_n(inverse, 4, R.m_Data);
+    return true;
+}
+
+bool kel_getInversedMatrix_3x3(const kelMat& A, kelMat& R) {
+    const float det = A.getDeterminant();
+    if (det == 0.0f)
+        return false;
+    float inverse[9];
+    invert3x3(A[0], A[1], A[2], det, inverse);
+    R.create(3, 3, false);
+    std::copy_n(inverse, 9, R.m_Data);
+    return true;
+}
+
+bool kel_getInversedMatrix_NxN(const kelMat& A, kelMat& R) {
+    const int n = A.m_Width;
+    kel::LUCopy lu(A);
+    if (!lu.ok)
+        return false;
+    R.create(n, n, false);
+    kel::invertLU(lu.a.data(), n, lu.indx.data(), R.m_Data);
     return true;
 }
 
 bool kel_getInversedMatrix_NxM(const kelMat& A, kelMat& R) {
     const int m = A.m_Height, n = A.m_Width;
-    const kelMat T = A.getTransposedMatrix();
-    kel::SmallMat P(n, n);
-    kel::multiply(P.m_Data, T.m_Data, A.m_Data, n, m, n);
-    kelMat Q;
-    if (!P.getInversedMatrix(Q))
+    if (n < 2)
+        kelMat(n, n).getInversedMatrix(); // stops the process on the size
+    const size_t square = static_cast<size_t>(n) * n;
+    kel::SquareScratch T(static_cast<size_t>(n) * m), P(square), Q(square);
+    kel::transpose(T.data(), A.m_Data, m, n);
+    kel::multiply(P.data(), T.data(), A.m_Data, n, m, n);
+    if (!kel::invert(P.data(), n, Q.data()))
         return false;
     R.create(n, m, false);
-    kel::multiply(R.m_Data, Q.m_Data, T.m_Data, n, n, m);
+    kel::multiply(R.m_Data, Q.data(), T.data(), n, n, m);
     return true;
 }

@@ -72,9 +72,9 @@ template <int N> void rotate(float* tiles, ptrdiff_t tileFloats, const Rotation*
  */
 class Tiles {
 public:
-    explicit Tiles(kelMat& M)
-        : m_rows(M.m_Height), m_columns(M.m_Width), m_full(M.m_Height / kLanes), m_floats(ptrdiff_t(kLanes) * M.m_Width),
-          m_data(M.m_Data), m_last(m_floats), m_spare(m_floats) {}
+    Tiles(float* data, int rows, int columns)
+        : m_rows(rows), m_columns(columns), m_full(rows / kLanes), m_floats(ptrdiff_t(kLanes) * columns), m_data(data),
+          m_last(m_floats), m_spare(m_floats) {}
 
     ptrdiff_t floats() const { return m_floats; }
     int count() const { return (m_rows + kLanes - 1) / kLanes; }
@@ -275,8 +275,10 @@ private:
 
 class Svd {
 public:
-    Svd(kelMat& u, bool withU, kelMat& v)
-        : m(u.m_Height), n(u.m_Width), m_withU(withU), U(u), V(v), m_v(v.m_Data), m_space(spaceFor(n)) {
+    Svd(int rows, int columns, float* u, bool withU, float* values, float* v)
+        : m(rows), n(columns), m_withU(withU), U(u, rows, columns), V(v, columns, columns), m_v(v), w(values),
+          m_space(spaceFor(columns)) {
+        std::fill_n(v, static_cast<ptrdiff_t>(n) * n, 0.0f);
         float* next = m_space.data();
         const auto take = [&](ptrdiff_t floats) {
             next += floats;
@@ -286,12 +288,11 @@ public:
         m_row = take(kLanes * n);
         m_step = take(kLanes * n);
         m_sums = take(kLanes * kMostGroups + n) + kLanes * kMostGroups;
-        w = take(n);
         e = take(n);
         m_rows = take(static_cast<ptrdiff_t>(n) * n);
     }
 
-    bool run(const float* a, kelMat& wOut) {
+    bool run(const float* a) {
         U.pack(a);
         bidiagonalize();
         accumulateRight();
@@ -304,8 +305,6 @@ public:
         V.unpack(0, V.count());
         if (m_withU)
             finishU();
-        for (int i = 0; i < n; ++i)
-            wOut.m_Data[static_cast<ptrdiff_t>(i) * n + i] = w[i];
         return converged;
     }
 
@@ -319,13 +318,14 @@ private:
     float* const m_v;                 // V in rows, before it is packed
     float *m_factor, *m_row, *m_step; // a number per column, each four times
     float* m_sums;                    // a number per column
-    float *w, *e;                     // diagonal and superdiagonal
+    float* const w;                   // diagonal: the singular values in the end
+    float* e;                         // superdiagonal
     float* m_rows;                    // the Householder vectors of the rows, n x n
-    Scratch<float, kLanes * kMostGroups + kel::kSmallOrder*(3 * kLanes + 3 + kel::kSmallOrder)> m_space;
+    Scratch<float, kLanes * kMostGroups + kel::kSmallOrder*(3 * kLanes + 2 + kel::kSmallOrder)> m_space;
     Rotations m_rotations;
     float m_norm = 0.0f; // the largest |w| + |e|, the measure of what is negligible
 
-    static size_t spaceFor(size_t n) { return kLanes * kMostGroups + n * (3 * kLanes + 3 + n); }
+    static size_t spaceFor(size_t n) { return kLanes * kMostGroups + n * (3 * kLanes + 2 + n); }
     static void fill4(float* four, float x) { _mm_store_ps(four, _mm_set1_ps(x)); }
     bool negligible(float x) const { return std::fabs(x) + m_norm == m_norm; }
 
@@ -692,11 +692,8 @@ private:
 
 namespace kel {
 
-bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v) {
-    const int n = u.m_Width;
-    w.create(n, n, true);
-    v.create(n, n, true);
-    return n == 0 || Svd(u, withU, v).run(a, w);
+bool decomposeSV(const float* a, int m, int n, float* u, bool withU, float* w, float* v) {
+    return n == 0 || Svd(m, n, u, withU, w, v).run(a);
 }
 
 } // namespace kel

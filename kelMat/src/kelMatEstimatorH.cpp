@@ -16,16 +16,33 @@ void fillRows(float* row, float x1, float y1, float x2, float y2) {
     std::copy_n(rows, 2 * kUnknowns, row);
 }
 
-// G is the unit square's homography with a last element of 1; the result is the adjugate over the determinant.
+// The inverse of a homography of the unit square, the adjugate over the determinant:
+//     | g0 g1 g2 |           | g4 - g5 g7     g2 g7 - g1     g1 g5 - g2 g4 |
+// G = | g3 g4 g5 |,  adj G = | g5 g6 - g3     g0 - g2 g6     g2 g3 - g0 g5 |
+//     | g6 g7 1  |           | g3 g7 - g4 g6  g1 g6 - g0 g7  g0 g4 - g1 g3 |
 void invertUnitSquareProjection(const float* g, float* inverse) {
-    const float determinant =
-        g[0] * g[4] - g[7] * (g[5] * g[0]) - g[3] * g[1] + g[7] * (g[3] * g[2]) + g[5] * (g[1] * g[6]) - g[4] * (g[2] * g[6]);
+    const float g04 = g[0] * g[4], g05 = g[0] * g[5], g07 = g[0] * g[7], g13 = g[1] * g[3], g15 = g[1] * g[5],
+                g16 = g[1] * g[6], g23 = g[2] * g[3], g24 = g[2] * g[4], g26 = g[2] * g[6], g27 = g[2] * g[7],
+                g37 = g[3] * g[7], g46 = g[4] * g[6], g56 = g[5] * g[6], g57 = g[5] * g[7];
+    const float determinant = g04 - g[7] * g05 - g13 + g[7] * g23 + g[5] * g16 - g[4] * g26;
     const float r = 1.0f / determinant;
-    const float adjugate[9] = {g[4] - g[5] * g[7],        g[2] * g[7] - g[1],        g[1] * g[5] - g[2] * g[4],
-                               g[5] * g[6] - g[3],        g[0] - g[2] * g[6],        g[2] * g[3] - g[0] * g[5],
-                               g[3] * g[7] - g[4] * g[6], g[1] * g[6] - g[0] * g[7], g[0] * g[4] - g[1] * g[3]};
+    const float adjugate[9] = {g[4] - g57, g27 - g[1], g15 - g24, //
+                               g56 - g[3], g[0] - g26, g23 - g05, //
+                               g37 - g46,  g16 - g07,  g04 - g13};
     for (int i = 0; i < 9; ++i)
         inverse[i] = adjugate[i] * r;
+}
+
+// The homography through four pairs, each x1, y1, x2, y2, by way of the unit square: H = G2 G1^-1, where G1 takes the square to the
+// first points and G2 to the second.
+void fitFourPairs(kelMat& H, const float (&p)[4][4]) {
+    float G1[9], G2[9], inverse[9], product[9];
+    UnitSquareProjection(p[0][0], p[0][1], p[1][0], p[1][1], p[2][0], p[2][1], p[3][0], p[3][1], G1);
+    UnitSquareProjection(p[0][2], p[0][3], p[1][2], p[1][3], p[2][2], p[2][3], p[3][2], p[3][3], G2);
+    G2[8] = 1.0f;
+    invertUnitSquareProjection(G1, inverse);
+    kel::multiplySmall<3, 3, 3>(product, G2, inverse);
+    kel::assign<3>(H, product);
 }
 
 // countInliers() for a homography.
@@ -45,14 +62,27 @@ int countTransfers(const kelMat& H, const kelMatCorrespH& corresp, float thresho
 
 struct Model {
     using Set = kelMatCorrespH;
-    static constexpr int kColumns = 3, kLeastPairs = 5;
+    static constexpr int kColumns = 3, kLeastPairs = 5, kSample = 4, kEnoughInliers = 50;
     static void fillRows(float* row, const Set& set, int i) {
         ::fillRows(row, set.m_SrcX[i], set.m_SrcY[i], set.m_DstX[i], set.m_DstY[i]);
     }
     static int count(const kelMat& H, const Set& set, float threshold, int best, uint8_t* marks) {
         return countTransfers(H, set, threshold, best, marks);
     }
+    static void fitSample(kelMat& H, const Set& set) {
+        int a, b, c, d;
+        getRandomIndex(a, b, c, d, set.m_Num);
+        const auto &x1 = set.m_SrcX, &y1 = set.m_SrcY, &x2 = set.m_DstX, &y2 = set.m_DstY;
+        fitFourPairs(H, {{x1[a], y1[a], x2[a], y2[a]},
+                         {x1[b], y1[b], x2[b], y2[b]},
+                         {x1[c], y1[c], x2[c], y2[c]},
+                         {x1[d], y1[d], x2[d], y2[d]}});
+    }
     static bool isPlausible(kelMat& H) { return judgeHomography(H); }
+    // Rounded; more than there are to be had change nothing.
+    static int fewerDraws(int draws, double needed) {
+        return needed > kel::kMostDraws ? draws : std::min(draws, kel::truncated(needed + 0.5));
+    }
 };
 
 } // namespace
@@ -64,12 +94,8 @@ kelMatEstimatorH::~kelMatEstimatorH() {}
 bool kelMatEstimatorH::estimate_by4P(float x1_0, float y1_0, float x2_0, float y2_0, float x1_1, float y1_1, float x2_1,
                                      float y2_1, float x1_2, float y1_2, float x2_2, float y2_2, float x1_3, float y1_3,
                                      float x2_3, float y2_3) {
-    float G1[9], G2[9], inverse[9];
-    UnitSquareProjection(x1_0, y1_0, x1_1, y1_1, x1_2, y1_2, x1_3, y1_3, G1);
-    UnitSquareProjection(x2_0, y2_0, x2_1, y2_1, x2_2, y2_2, x2_3, y2_3, G2);
-    G2[8] = 1.0f;
-    invertUnitSquareProjection(G1, inverse);
-    kel::multiplySmall<3, 3, 3>(m_Data, G2, inverse);
+    fitFourPairs(*this,
+                 {{x1_0, y1_0, x2_0, y2_0}, {x1_1, y1_1, x2_1, y2_1}, {x1_2, y1_2, x2_2, y2_2}, {x1_3, y1_3, x2_3, y2_3}});
     return true;
 }
 
@@ -108,41 +134,12 @@ bool kelMatEstimatorH::estimate_byTaubin(kelMatCorrespH& corresp) {
     for (int i = 1; i < lambda.m_Height; ++i)
         if (lambda[i][0] > lambda[k][0])
             k = i;
-    kel::eigenvectorOrNaN<kUnknowns>(X, k, m_Data);
-    setDataUnitize();
+    kel::assignEigenvector<3>(*this, X, k);
     return true;
 }
 
 bool kelMatEstimatorH::estimate_byRANSAC_fine(kelMatCorrespH& corresp, float threshold, int* inliers) {
-    constexpr int kSample = 4, kMostDraws = 1500, kManyDraws = 1600, kEnoughInliers = 50;
-    const int n = corresp.m_Num;
-    if (n < kSample)
-        return false;
-    kelMatCorrespH normalized;
-    kelMat T1, T2;
-    corresp.normalize(normalized, T1, T2);
-    const std::vector<float>&x1 = normalized.m_SrcX, &y1 = normalized.m_SrcY, &x2 = normalized.m_DstX, &y2 = normalized.m_DstY;
-
-    kel::Marks current(n), chosen(n);
-    int best = 0, draws = kMostDraws, draw = 0;
-    do {
-        int a, b, c, d;
-        getRandomIndex(a, b, c, d, n);
-        estimate_by4P(x1[a], y1[a], x2[a], y2[a], x1[b], y1[b], x2[b], y2[b], x1[c], y1[c], x2[c], y2[c], x1[d], y1[d], x2[d],
-                      y2[d]);
-        kel::denormalize<3>(*this, T2, T1);
-        if (judgeHomography(*this)) {
-            const int count = countTransfers(*this, corresp, threshold, best, current.bytes());
-            if (count > best) {
-                const double needed = kel::drawsNeeded(count, n);
-                draws = std::min(draws, needed > kMostDraws ? kManyDraws : kel::truncated(needed + 0.5));
-                std::swap(current, chosen);
-                best = count;
-            }
-        }
-    } while (best < kEnoughInliers && ++draw < draws);
-
-    const int count = kel::refit<Model>(*this, corresp, normalized, T1, T2, threshold, chosen, best);
+    const int count = kel::robustFit<Model>(*this, corresp, threshold);
     if (count >= 0 && inliers)
         *inliers = count;
     return count >= 0;

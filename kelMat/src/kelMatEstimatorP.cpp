@@ -35,14 +35,24 @@ int countProjections(const kelMat& P, const kelMatCorrespP& corresp, float thres
 
 struct Model {
     using Set = kelMatCorrespP;
-    static constexpr int kColumns = 4, kLeastPairs = 6;
+    static constexpr int kColumns = 4, kLeastPairs = 6, kSample = 6, kEnoughInliers = 400;
     static void fillRows(float* row, const Set& set, int i) {
         ::fillRows(row, set.m_ObjX[i], set.m_ObjY[i], set.m_ObjZ[i], set.m_ImgX[i], set.m_ImgY[i]);
     }
     static int count(const kelMat& P, const Set& set, float threshold, int best, uint8_t* marks) {
         return countProjections(P, set, threshold, best, marks);
     }
+    static void fitSample(kelMat& P, const Set& set) {
+        int i[kSample];
+        getRandomIndex(set.m_Num, i[0], i[1], i[2], i[3], i[4], i[5]);
+        float rows[kSample][2 * kUnknowns];
+        for (int k = 0; k < kSample; ++k)
+            fillRows(rows[k], set, i[k]);
+        kel::solveRows<Model>(P, rows[0], kSample);
+    }
     static bool isPlausible(kelMat& P) { return judgeMatrixP(P); }
+    // Truncated; NaN changes nothing.
+    static int fewerDraws(int draws, double needed) { return draws > needed ? kel::truncated(needed) : draws; }
 };
 
 void printBlock(const char* title, kelMat& M) {
@@ -117,44 +127,13 @@ bool kelMatEstimatorP::estimate_byTaubin(kelMatCorrespP& corresp) {
     N.getGeneralizedEigenValue(M, lambda, V);
     const int k = chooseEigenvalue(lambda);
     printBlock("eigenvalue", lambda);
-    kel::eigenvectorOrNaN<kUnknowns>(V, k, m_Data);
-    setDataUnitize();
+    kel::assignEigenvector<4>(*this, V, k);
     printBlock("result", *this);
     return true;
 }
 
 bool kelMatEstimatorP::estimate_byRANSAC_fine(kelMatCorrespP& corresp, float threshold) {
-    constexpr int kSample = 6, kMostDraws = 1500, kEnoughInliers = 400;
-    const int n = corresp.m_Num;
-    if (n < Model::kLeastPairs)
-        return false;
-    kelMatCorrespP normalized;
-    kelMat T1, T2;
-    corresp.normalize(normalized, T1, T2);
-
-    kel::Marks current(n), chosen(n);
-    kel::LocalMat<2 * kSample * kUnknowns> sample(2 * kSample, kUnknowns);
-    int best = 0, draws = kMostDraws, draw = 0;
-    do {
-        int index[kSample];
-        getRandomIndex(n, index[0], index[1], index[2], index[3], index[4], index[5]);
-        for (int i = 0; i < kSample; ++i)
-            Model::fillRows(sample[2 * i], normalized, index[i]);
-        kel::solve<Model>(*this, sample);
-        kel::denormalize<4>(*this, T2, T1);
-        if (judgeMatrixP(*this)) {
-            const int count = countProjections(*this, corresp, threshold, best, current.bytes());
-            if (count > best) {
-                const double needed = kel::drawsNeeded(count, n);
-                if (draws > needed)
-                    draws = kel::truncated(needed);
-                std::swap(current, chosen);
-                best = count;
-            }
-        }
-    } while (best < kEnoughInliers && ++draw < draws);
-
-    return kel::refit<Model>(*this, corresp, normalized, T1, T2, threshold, chosen, best) >= 0;
+    return kel::robustFit<Model>(*this, corresp, threshold) >= 0;
 }
 
 void getRandomIndex(int n, int& a, int& b, int& c, int& d, int& e, int& f) {

@@ -3,6 +3,7 @@
 #ifndef KEL_MAT_PRIVATE_H
 #define KEL_MAT_PRIVATE_H
 
+#include <algorithm>
 #include <cmath>
 #include <cstddef>
 #include <cstdlib>
@@ -33,37 +34,9 @@ private:
     T* m_data;
 };
 
-// A temporary matrix whose elements (indeterminate at first) lie inside the object up to N of them. It may be used wherever
-// elements are read or written, but not where it would be created anew, resized or assigned to.
-template <size_t N> class LocalMat : public kelMat {
-public:
-    LocalMat(int height, int width) {
-        if (height < 1 || width < 1)
-            return;
-        if (static_cast<size_t>(height) * static_cast<size_t>(width) > N) {
-            create(height, width, false);
-            return;
-        }
-        m_Height = height;
-        m_Width = width;
-        m_IsCreated = true;
-        m_Data = m_inside;
-    }
-    explicit LocalMat(const kelMat& M) : LocalMat(M.m_Height, M.m_Width) { setData(M.m_Data); }
-    ~LocalMat() {
-        if (m_Data == m_inside)
-            m_Data = nullptr;
-    }
-    LocalMat(const LocalMat&) = delete;
-    LocalMat& operator=(const LocalMat&) = delete;
-
-private:
-    alignas(16) float m_inside[N];
-};
-
 // Orders up to which temporaries stay on the stack: those of the estimators, 12 at most.
 constexpr int kSmallOrder = 12;
-using SmallMat = LocalMat<kSmallOrder * kSmallOrder>;
+using SquareScratch = Scratch<float, kSmallOrder * kSmallOrder>;
 
 inline float sign(float x) {
     return x >= 0.0f ? 1.0f : -1.0f;
@@ -79,6 +52,16 @@ inline float pythag(float a, float b) {
     return static_cast<float>(static_cast<double>(longer) * std::sqrt(static_cast<double>(q)));
 }
 
+// From the rows of the matrix; that of order 3 along the last column, summed from its top.
+inline float determinant2x2(const float* a, const float* b) {
+    return a[0] * b[1] - a[1] * b[0];
+}
+inline float determinant3x3(const float* a, const float* b, const float* c) {
+    const float top = (b[0] * c[1] - b[1] * c[0]) * a[2];
+    const float middle = (c[0] * a[1] - c[1] * a[0]) * b[2] + top;
+    return (a[0] * b[1] - a[1] * b[0]) * c[2] + middle;
+}
+
 // to[i] -= factor * from[i].
 inline void subtractMultiple(float* to, float factor, const float* from, ptrdiff_t count) {
     const __m128 factors = _mm_set1_ps(factor);
@@ -89,22 +72,43 @@ inline void subtractMultiple(float* to, float factor, const float* from, ptrdiff
         to[i] -= factor * from[i];
 }
 
-// R = A B, A (rows x inner) and B (inner x columns) row by row without gaps, apart from R. Every element sums over `inner` in
-// increasing order, from 0.
+// ---- kernels over elements that the caller owns: row by row without gaps, n x n where no other size is given -----------------
+
+// R = A B, A (rows x inner) and B (inner x columns), apart from R. Every element sums over `inner` in increasing order, from 0.
 void multiply(float* R, const float* A, const float* B, int rows, int inner, int columns);
 
 // T = the transpose of A (rows x columns), apart from A.
 void transpose(float* T, const float* A, int rows, int columns);
 
-// Singular value decomposition of a, which has the size of u and is u.m_Data itself or apart from it. Creates w and v, n x n.
-// With `withU` u becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs about
-// half, and w and v have the same bits. False where a value does not converge.
-bool decompose(const float* a, kelMat& u, bool withU, kelMat& w, kelMat& v);
+// What nr_ludcmp(), nr_lubksb(), nr_choldc() and nr_jacobi() do.
+bool decomposeLU(float* a, int n, int* indx, float* parity);
+void substituteLU(const float* lu, int n, const int* indx, float* b);
+bool decomposeCholesky(float* a, int n);
+bool jacobi(float* a, int n, float* d, float* v, int* rotations);
 
-// The w and v of nr_svdcmp(), bit for bit, where a is not needed any more.
-inline bool decomposeWithoutU(kelMat& a, kelMat& w, kelMat& v) {
-    return decompose(a.m_Data, a, false, w, v);
-}
+// The inverse into R, apart from the decomposition.
+void invertLU(const float* lu, int n, const int* indx, float* R);
+
+// The inverse of a, which is left with nothing of use, into R apart from it: in closed form for n of 2 and 3, by LU beyond. False, and
+// R as it was, where it is singular.
+bool invert(float* a, int n, float* R);
+
+// A square matrix's decomposition on a copy; `ok` is that of decomposeLU().
+struct LUCopy {
+    SquareScratch a;
+    Scratch<int, kSmallOrder> indx;
+    float parity;
+    bool ok;
+    explicit LUCopy(const kelMat& M) : a(static_cast<size_t>(M.m_Width) * M.m_Width), indx(M.m_Width) {
+        std::copy_n(M.m_Data, static_cast<ptrdiff_t>(M.m_Width) * M.m_Width, a.data());
+        ok = decomposeLU(a.data(), M.m_Width, indx.data(), &parity);
+    }
+};
+
+// Singular value decomposition of a (m x n), which is u itself or apart from it: n singular values in w, v n x n. With `withU` u
+// (m x n) becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs about half, and
+// w and v have the same bits. False where a value does not converge.
+bool decomposeSV(const float* a, int m, int n, float* u, bool withU, float* w, float* v);
 
 } // namespace kel
 

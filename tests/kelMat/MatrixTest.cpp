@@ -54,8 +54,8 @@ TEST(MatrixStorage, CopiesDeeplyAndAcceptsEmptySources) {
 }
 
 TEST(MatrixStorage, FreesBeforeItAllocates) {
-    if (!kOwnMalloc)
-        GTEST_SKIP() << "the sanitizer counts instead";
+    if (!ownMalloc())
+        GTEST_SKIP() << "another malloc is in use";
     kelMat A(3, 3);
     {
         const CountedMemory memory;

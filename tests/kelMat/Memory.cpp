@@ -9,7 +9,8 @@
 namespace {
 
 thread_local bool counting, protecting;
-thread_local int allocations, releases;
+thread_local int allocations, releases, left = -1; // left: before memory is scarce, if it is not negative
+thread_local size_t largestBlock;
 thread_local kel_test::Protect side;
 
 } // namespace
@@ -18,6 +19,7 @@ namespace kel_test {
 
 CountedMemory::CountedMemory() {
     allocations = releases = 0;
+    largestBlock = 0;
     counting = true;
 }
 CountedMemory::~CountedMemory() {
@@ -28,6 +30,17 @@ int CountedMemory::allocated() const {
 }
 int CountedMemory::held() const {
     return allocations - releases;
+}
+
+size_t CountedMemory::largest() const {
+    return largestBlock;
+}
+
+ScarceMemory::ScarceMemory(int number) {
+    left = number;
+}
+ScarceMemory::~ScarceMemory() {
+    left = -1;
 }
 
 ProtectedMemory::ProtectedMemory(Protect where) {
@@ -92,7 +105,11 @@ bool releasedProtected(void* user) {
 } // namespace
 
 extern "C" void* malloc(size_t bytes) {
+    if (left == 0)
+        return nullptr;
+    left -= left > 0;
     allocations += counting;
+    largestBlock = bytes > largestBlock ? bytes : largestBlock;
     return protecting ? protectedBlock(bytes) : __libc_malloc(bytes);
 }
 
