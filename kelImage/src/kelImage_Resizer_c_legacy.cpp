@@ -511,9 +511,9 @@ void resizeKelImageHalf(kelImage_t* dst, const kelImage_t* src) {
 }
 
 void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
-    const Steps across(dst->width, src->width), down(dst->height, src->height);
     if (dst->width < 0 || dst->height < 0)
         return;
+    const Steps across(dst->width, src->width), down(dst->height, src->height);
     const kelValue_s32 end = src->height - 1; // the row below the last one is the last one
     Buffer<uint32_t> above = allocate<uint32_t>(dst->width), below = allocate<uint32_t>(dst->width),
                      last = allocate<uint32_t>(dst->width);
@@ -540,6 +540,8 @@ void resizeLinerInterpolation(kelImage_t* dst, const kelImage_t* src) {
 }
 
 void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src) {
+    if (dst->width < 0 || dst->height < 0)
+        return;
     const Ratio across(dst->width, src->width), down(dst->height, src->height);
     if (across.isHalf() && down.isHalf() && dst->width % 4 == 0)
         return halveBothWays(dst, src);

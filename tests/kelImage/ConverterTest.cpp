@@ -10,6 +10,7 @@
 #include "GuardedImage.h"
 #include "Stops.h"
 #include "Sweep.h"
+#include "Valgrind.h"
 #include "kelImage_YuvWide.h"
 
 using kel_test::Bytes;
@@ -207,6 +208,7 @@ TEST(Converter, GivesKnownValues) {
 
 // All 16.7 million of (Y, U, V), for both arithmetics: a 256x256 image for each U, Y along the rows and V down.
 TEST(Converter, TurnsEveryYuvIntoColour) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     const Image yuv(256, 256, 40), rgb(256, 256, 24), bgr(256, 256, 8), rgba(256, 256, 32), bgra(256, 256, 16);
     for (int u = 0; u < 256; ++u) {
         for (int v = 0; v < 256; ++v)
@@ -278,6 +280,7 @@ TEST(Converter, YuvVariantsOfEveryWidthGiveTheSameBytes) {
 }
 
 TEST(Dispatcher, RoutesEveryPairOfTypes) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     for (int from = -1; from < 50; ++from)
         for (int to = -1; to < 50; ++to)
             for (int width : {6, 20, 32}) {

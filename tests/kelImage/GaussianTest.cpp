@@ -5,6 +5,7 @@
 #include "FilterReference.h"
 #include "GuardedImage.h"
 #include "Stops.h"
+#include "Valgrind.h"
 
 using kel_test::Bytes;
 using kel_test::Fill;
@@ -93,6 +94,7 @@ std::vector<int> widths() {
 } // namespace
 
 TEST(Gaussian, EqualsThePlainPassesAtEverySize) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     int round = 0;
     for (int width : widths())
         for (int height : {0, 1, 4, 5, 6, 7, 8, 9, 10, 11, 16})
@@ -105,6 +107,7 @@ TEST(Gaussian, EqualsThePlainPassesAtEverySize) {
 }
 
 TEST(Gaussian, EqualsThePlainPassesOnEveryFill) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     for (Fill fill : kel_test::kFills)
         for (Guard guard : {Guard::Behind, Guard::Before})
             for (bool inPlace : {false, true})

@@ -6,9 +6,7 @@
 #include <memory>
 
 #include "Random.h"
-
-#if __has_include(<valgrind/memcheck.h>)
-#include <valgrind/memcheck.h>
+#include "Valgrind.h"
 
 namespace {
 
@@ -159,5 +157,3 @@ TEST(Indeterminate, PaddingHasNoPartInKeypoints) {
         EXPECT_EQ(VALGRIND_CHECK_MEM_IS_DEFINED(keypoints, static_cast<size_t>(count) * sizeof keypoints[0]), 0u);
     }
 }
-
-#endif

@@ -7,6 +7,7 @@
 #include "GuardedImage.h"
 #include "Stops.h"
 #include "TransformReference.h"
+#include "Valgrind.h"
 
 namespace {
 
@@ -64,6 +65,7 @@ TEST(Half, KeepsEverySecondPixelOfEverySecondRow) {
 }
 
 TEST(Nearest, SamplesAtWholeRatiosByWidth) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     for (int type : kMoved)
         for (Size dst : {Size{1, 1}, Size{5, 3}, Size{12, 2}, Size{16, 4}, Size{17, 5}, Size{40, 3}})
             for (int rx : {0, 1, 2, 3, 4, 5, 8})
@@ -78,6 +80,7 @@ TEST(Nearest, SamplesAtWholeRatiosByWidth) {
 }
 
 TEST(Bilinear, AveragesNeighboursAtWholeRatiosByWidth) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     for (Fill fill : kel_test::kFills)
         for (int width : kWidths)
             for (int rx : {0, 1, 2, 3, 4, 5, 7})
@@ -154,6 +157,7 @@ TEST(ZeroOrderHold, AveragesOverHugeBoxes) {
 }
 
 TEST(Border, ReplicatesEdgesAndCropsThemAgain) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
     for (int type : kMoved)
         for (int width : kWidths)
             for (int height : {1, 2, 5})
