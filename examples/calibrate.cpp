@@ -139,11 +139,12 @@ int calibrate(const Options& options) {
             sum += std::hypot(x - pairs.m_ImgX[i], y - pairs.m_ImgY[i]);
         }
     makeFolder(options.output);
-    writePicture(options.output + "/reprojection.png", drawReprojection(pairs, estimate, inlier));
     printTable(truth, estimate);
     std::printf("%d of %d pairs fit (%d were spoilt), mean reprojection error %.3f px\n", inliers, pairs.m_Num,
                 static_cast<int>(std::count(spoilt.begin(), spoilt.end(), true)),
                 static_cast<double>(sum / static_cast<float>(inliers)));
+    flushResults();
+    writePicture(options.output + "/reprojection.png", drawReprojection(pairs, estimate, inlier));
     std::printf("wrote %s/reprojection.png\n", options.output.c_str());
     return 0;
 }
@@ -160,11 +161,9 @@ int main(int argc, char** argv) {
         ->check(CLI::Range(6, int(KEL_CORRESP_MAX)))
         ->capture_default_str();
     app.add_option("--noise", options.noise, "standard deviation of the image points in pixels")
-        ->check(CLI::Range(0.0f, 50.0f))
+        ->check(numberIn(0, 50))
         ->capture_default_str();
-    app.add_option("--outliers", options.outliers, "share of spoilt pairs")
-        ->check(CLI::Range(0.0f, 1.0f))
-        ->capture_default_str();
+    app.add_option("--outliers", options.outliers, "share of spoilt pairs")->check(numberIn(0, 1))->capture_default_str();
     app.add_option("--seed", options.seed, "of everything random")->capture_default_str();
     app.add_option("--output", options.output, "folder for reprojection.png")->capture_default_str();
     return runProgram(app, argc, argv, [&] { return calibrate(options); });

@@ -37,9 +37,13 @@ Size sizeOf(const Image& image) {
 Result run(const Image& first, const Image& second, const Options& options) {
     const auto begin = std::chrono::steady_clock::now();
     Result r;
+    showProgress("finding keypoints in the first picture");
     r.first = findFeatures(greyOf(first), kMostFeatures);
+    showProgress("finding keypoints in the second picture");
     r.second = findFeatures(greyOf(second), kMostFeatures);
+    showProgress("matching them");
     r.matches = matchFeatures(r.first, r.second);
+    showProgress("fitting a homography");
     std::srand(options.seed);
     r.registration = fitHomography(r.first, r.second, r.matches, sizeOf(first), sizeOf(second), options.threshold);
     r.milliseconds = std::chrono::duration<double, std::milli>(std::chrono::steady_clock::now() - begin).count();
@@ -64,16 +68,27 @@ float meanError(kelMat H, kelMat truth, Size first, Size second) {
 }
 
 void writePictures(const Image& first, const Image& second, const Result& r, const std::string& folder) {
-    makeFolder(folder);
+    showProgress("drawing pictures");
     writePicture(folder + "/keypoints.png", drawKeypoints(first, second, r.first, r.second));
     writePicture(folder + "/matches.png", drawMatches(first, second, r.first, r.second, r.matches, r.registration.inlier));
     if (!r.registration.H.m_IsCreated) { // pictures of an earlier run would mislead
-        std::remove((folder + "/warped.png").c_str());
-        std::remove((folder + "/mosaic.png").c_str());
+        removeOutdated(folder + "/warped.png");
+        removeOutdated(folder + "/mosaic.png");
     } else {
         writePicture(folder + "/warped.png", warpPicture(first, r.registration.H, sizeOf(second)));
         writePicture(folder + "/mosaic.png", drawMosaic(first, second, r.registration.H));
     }
+}
+
+void printResult(const Result& r, const kelMat& truth, Size first, Size second) {
+    for (int i = 0; i < 9; ++i)
+        std::printf(i < 8 ? "%.9g " : "%.9g\n", static_cast<double>(r.registration.H.m_Data[i]));
+    std::printf("%zu keypoints, %zu matches, %d inliers, %.1f milliseconds\n", r.first.size() + r.second.size(),
+                r.matches.size(), r.registration.inliers, r.milliseconds);
+    if (truth.m_IsCreated)
+        std::printf("mean error against the truth: %.2f pixels\n",
+                    static_cast<double>(meanError(r.registration.H, truth, first, second)));
+    flushResults();
 }
 
 int registerPictures(const Options& options) {
@@ -88,19 +103,17 @@ int registerPictures(const Options& options) {
         first = readPicture(options.pictures[0]);
         second = readPicture(options.pictures[1]);
     }
+    makeFolder(options.output);
     const Result r = run(first, second, options);
-    writePictures(first, second, r, options.output);
+    showProgress("");
     if (!r.registration.H.m_IsCreated) {
         std::cerr << "register: no reliable homography: " << r.registration.refusal << '\n';
+        writePictures(first, second, r, options.output);
         return 2;
     }
-    for (int i = 0; i < 9; ++i)
-        std::printf(i < 8 ? "%.9g " : "%.9g\n", static_cast<double>(r.registration.H.m_Data[i]));
-    std::printf("%zu keypoints, %zu matches, %d inliers, %.1f milliseconds\n", r.first.size() + r.second.size(),
-                r.matches.size(), r.registration.inliers, r.milliseconds);
-    if (truth.m_IsCreated)
-        std::printf("mean error against the truth: %.2f pixels\n",
-                    static_cast<double>(meanError(r.registration.H, truth, sizeOf(first), sizeOf(second))));
+    printResult(r, truth, sizeOf(first), sizeOf(second));
+    writePictures(first, second, r, options.output);
+    showProgress("");
     if (options.pictures.empty())
         for (const char* name : {"keypoints", "matches", "warped", "mosaic"})
             std::printf("wrote %s/%s.png\n", options.output.c_str(), name);
@@ -120,7 +133,7 @@ int main(int argc, char** argv) {
     app.add_option("--output", options.output, "folder for keypoints.png, matches.png, warped.png and mosaic.png")
         ->capture_default_str();
     app.add_option("--threshold", options.threshold, "inlier distance in pixels")
-        ->check(CLI::Range(0.1f, 100.0f))
+        ->check(numberIn(0.1, 100))
         ->capture_default_str();
     app.add_option("--seed", options.seed, "of the random samples, and of the rendered scene")->capture_default_str();
     return runProgram(app, argc, argv, [&] {

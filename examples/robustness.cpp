@@ -11,7 +11,6 @@
 #include <sstream>
 #include <vector>
 
-#include "common/Picture.h"
 #include "common/Program.h"
 
 namespace {
@@ -90,6 +89,7 @@ void printRow(const std::string& name, Sets& sets, const Options& options) {
         successes += errors.back() < options.success;
     }
     std::sort(errors.begin(), errors.end());
+    kel_examples::showProgress("");
     const double n = options.seeds, found = std::max<double>(1, static_cast<double>(errors.size()));
     std::printf("| %s | %d | %.0f | %s | %.1f %% | %.1f %% | %.0f |\n", name.c_str(), sets.matches.m_Num, inlierSum / found,
                 errors.empty() ? "-" : std::to_string(errors[errors.size() / 2]).substr(0, 5).c_str(),
@@ -112,6 +112,8 @@ int measure(const Options& options) {
                 "|\n|---|---:|---:|---:|---:|---:|---:|\n",
                 static_cast<double>(options.success));
     for (const auto& file : files) {
+        kel_examples::flushResults();
+        kel_examples::showProgress(file.filename().string());
         Sets sets = readSets(file, options.swapped);
         const std::string name = file.filename().string();
         printRow(name.substr(0, name.find("_pts.txt")), sets, options);
@@ -131,9 +133,11 @@ int main(int argc, char** argv) {
         "robustness");
     app.add_option("folder", options.folder, "with the sets")->required();
     app.add_option("--threshold", options.threshold, "inlier distance in pixels")
-        ->check(CLI::Range(0.1f, 100.0f))
+        ->check(kel_examples::numberIn(0.1, 100))
         ->capture_default_str();
-    app.add_option("--success", options.success, "largest mean error of a success in pixels")->capture_default_str();
+    app.add_option("--success", options.success, "largest mean error of a success in pixels")
+        ->check(kel_examples::numberIn(0, 1e6))
+        ->capture_default_str();
     app.add_option("--seeds", options.seeds, "number of seeds")->check(CLI::Range(1, 100000))->capture_default_str();
     app.add_flag("--swapped", options.swapped, "fit from the second points to the first");
     return kel_examples::runProgram(app, argc, argv, [&] { return measure(options); });

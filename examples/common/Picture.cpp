@@ -1,22 +1,24 @@
 // Decoding and encoding on libpng and libjpeg; PGM and PPM by hand.
 #include "Picture.h"
 
+#include <algorithm>
+#include <cctype>
 #include <cerrno>
 #include <csetjmp>
 #include <cstdio>
 #include <cstring>
 #include <filesystem>
-#include <fstream>
 #include <jpeglib.h>
+#include <new>
 #include <png.h>
-#include <unistd.h>
+#include <utility>
 #include <vector>
 
 namespace kel_examples {
 
 namespace {
 
-constexpr unsigned kMostPixels = 16384; // either way
+constexpr size_t kMostPixels = 16384, kMostInAll = size_t(1) << 27; // either way; in all
 
 [[noreturn]] void fail(const std::string& name, const std::string& what) {
     throw Error(name + ": " + what);
@@ -26,8 +28,9 @@ Image createPicture(size_t width, size_t height, const std::string& name) {
     const std::string size = std::to_string(width) + "x" + std::to_string(height);
     if (width < 2 || height < 2)
         fail(name, "a picture of " + size + " pixels is too small");
-    if (width > kMostPixels || height > kMostPixels || width * height > (size_t(1) << 27))
-        fail(name, "a picture of " + size + " pixels is too large");
+    if (width > kMostPixels || height > kMostPixels || width * height > kMostInAll)
+        fail(name, "a picture of " + size + " pixels is too large; at most " + std::to_string(kMostPixels) +
+                       " either way and " + std::to_string(kMostInAll) + " in all");
     Image image = create(static_cast<int>(width), static_cast<int>(height), KEL_PIXEL_TYPE_U8ZYX);
     if (!image->data)
         fail(name, "not enough memory for a picture of " + size + " pixels");
@@ -63,7 +66,7 @@ struct JpegErrors : jpeg_error_mgr {
     std::longjmp(errors->leave, 1);
 }
 
-// Between setjmp and longjmp no object with a destructor is made: `image` and `tooLarge` live outside.
+// Between setjmp and longjmp no object with a destructor is made: `image` and `refusal` live outside.
 bool decodeJpegInto(const uint8_t* bytes, size_t size, const std::string& name, JpegErrors& errors, Image& image,
                     std::string& refusal) {
     jpeg_decompress_struct jpeg;
@@ -80,6 +83,11 @@ bool decodeJpegInto(const uint8_t* bytes, size_t size, const std::string& name, 
     jpeg_create_decompress(&jpeg);
     jpeg_mem_src(&jpeg, bytes, size);
     jpeg_read_header(&jpeg, TRUE);
+    if (jpeg.jpeg_color_space == JCS_CMYK || jpeg.jpeg_color_space == JCS_YCCK) {
+        refusal = name + ": a JPEG file in the four printing colours (CMYK); save it as RGB first";
+        jpeg_destroy_decompress(&jpeg);
+        return false;
+    }
     jpeg.out_color_space = JCS_RGB;
     try {
         image = createPicture(jpeg.image_width, jpeg.image_height, name);
@@ -144,38 +152,71 @@ Image decodePnm(const uint8_t* bytes, size_t size, const std::string& name) {
     return image;
 }
 
+enum class Format { unknown, png, jpeg, pnm };
+
+Format formatOf(const uint8_t* bytes, size_t size) {
+    const auto startsWith = [&](const char* magic, size_t length) {
+        return size > length && !std::memcmp(bytes, magic, length);
+    };
+    if (startsWith("\x89PNG", 4))
+        return Format::png;
+    if (startsWith("\xff\xd8\xff", 3))
+        return Format::jpeg;
+    return startsWith("P5", 2) || startsWith("P6", 2) ? Format::pnm : Format::unknown;
+}
+
+[[noreturn]] void failAsUnknown(const std::string& name, size_t size) {
+    fail(name, size == 0 ? "the file is empty" : "not a picture: neither PNG, JPEG, nor binary PGM or PPM");
+}
+
+// The whole file, read only where it starts as a picture does, and never more than a picture can have.
 std::vector<uint8_t> readFile(const std::string& path) {
+    constexpr size_t kSignature = 8, kPiece = size_t(1) << 20, kMostBytes = size_t(1) << 30;
     std::error_code code;
     if (std::filesystem::is_directory(path, code))
         fail(path, "is a folder, not a picture");
-    errno = 0;
-    std::ifstream file(path, std::ios::binary);
+    const std::unique_ptr<std::FILE, int (*)(std::FILE*)> file(std::fopen(path.c_str(), "rb"), std::fclose);
     if (!file)
-        fail(path, std::string("cannot be opened: ") + std::strerror(errno ? errno : EIO));
-    std::vector<uint8_t> bytes((std::istreambuf_iterator<char>(file)), std::istreambuf_iterator<char>());
-    if (file.bad())
-        fail(path, "cannot be read");
+        fail(path, std::string("cannot be opened: ") + std::strerror(errno));
+    std::vector<uint8_t> bytes;
+    size_t wanted = kSignature, got = 0;
+    do {
+        const size_t before = bytes.size();
+        bytes.resize(before + wanted);
+        got = std::fread(&bytes[before], 1, wanted, file.get());
+        bytes.resize(before + got);
+        if (std::ferror(file.get()))
+            fail(path, std::string("cannot be read: ") + std::strerror(errno));
+        if (formatOf(bytes.data(), bytes.size()) == Format::unknown)
+            failAsUnknown(path, bytes.size());
+        if (bytes.size() > kMostBytes)
+            fail(path, "is larger than a picture may be, " + std::to_string(kMostBytes) + " bytes");
+    } while (got == std::exchange(wanted, kPiece));
     return bytes;
 }
 
 } // namespace
 
 Image decodePicture(const uint8_t* bytes, size_t size, const std::string& name) {
-    const auto startsWith = [&](const char* magic, size_t length) {
-        return size > length && !std::memcmp(bytes, magic, length);
-    };
-    if (startsWith("\x89PNG", 4))
+    switch (formatOf(bytes, size)) {
+    case Format::png:
         return decodePng(bytes, size, name);
-    if (startsWith("\xff\xd8\xff", 3))
+    case Format::jpeg:
         return decodeJpeg(bytes, size, name);
-    if (startsWith("P5", 2) || startsWith("P6", 2))
+    case Format::pnm:
         return decodePnm(bytes, size, name);
-    fail(name, size == 0 ? "the file is empty" : "not a picture: neither PNG, JPEG, nor binary PGM or PPM");
+    default:
+        failAsUnknown(name, size);
+    }
 }
 
 Image readPicture(const std::string& path) {
-    const std::vector<uint8_t> bytes = readFile(path);
-    return decodePicture(bytes.data(), bytes.size(), path);
+    try {
+        const std::vector<uint8_t> bytes = readFile(path);
+        return decodePicture(bytes.data(), bytes.size(), path);
+    } catch (const std::bad_alloc&) {
+        fail(path, "not enough memory to read it");
+    }
 }
 
 void writePicture(const std::string& path, const Image& image) {
@@ -185,25 +226,13 @@ void writePicture(const std::string& path, const Image& image) {
     png.height = static_cast<png_uint_32>(image->height);
     png.format = image->type == KEL_PIXEL_TYPE_U8G ? PNG_FORMAT_GRAY : PNG_FORMAT_RGB;
     png.flags = PNG_IMAGE_FLAG_FAST;
-    const std::string unfinished = path + "." + std::to_string(getpid()) + ".tmp";
-    std::FILE* const file = std::fopen(unfinished.c_str(), "wb");
-    if (!file)
-        fail(path, std::string("cannot be written: ") + std::strerror(errno));
-    bool written = png_image_write_to_stdio(&png, file, 0, image->data, image->channels * image->step, nullptr) != 0;
-    written = std::fclose(file) == 0 && written;
-    if (!written || std::rename(unfinished.c_str(), path.c_str()) != 0) {
-        std::remove(unfinished.c_str());
-        fail(path, "cannot be written");
-    }
-}
-
-void makeFolder(const std::string& path) {
-    std::error_code code;
-    std::filesystem::create_directories(path, code);
-    if (!std::filesystem::is_directory(path))
-        fail(path, "cannot be made: " + (code ? code.message() : std::string("it is no folder")));
-    if (access(path.c_str(), W_OK) != 0)
-        fail(path, std::string("cannot be written into: ") + std::strerror(errno));
+    png_alloc_size_t size = PNG_IMAGE_PNG_SIZE_MAX(png);
+    const std::unique_ptr<uint8_t[]> bytes(new uint8_t[size]);
+    if (!png_image_write_to_memory(&png, bytes.get(), &size, 0, image->data, image->channels * image->step, nullptr))
+        fail(path, std::string("cannot be encoded: ") + png.message);
+    Output file(path);
+    file.write(bytes.get(), size);
+    file.finish();
 }
 
 Image greyOf(const Image& picture) {

@@ -5,15 +5,11 @@
 #include <cstdint>
 #include <kel/kelImage.h>
 #include <memory>
-#include <stdexcept>
 #include <string>
 
-namespace kel_examples {
+#include "Output.h"
 
-// Bad input or output: what was wrong with which file.
-struct Error : std::runtime_error {
-    using std::runtime_error::runtime_error;
-};
+namespace kel_examples {
 
 struct Release {
     void operator()(kelImage_t* image) const { releaseKelImage(&image); }
@@ -30,14 +26,11 @@ inline Image clone(const Image& image) {
 // Decodes a picture in memory to RGB (U8ZYX). `name` stands in the errors.
 Image decodePicture(const uint8_t* bytes, size_t size, const std::string& name);
 
-// Reads a picture file to RGB (U8ZYX). At least 2 pixels and at most 16384 either way.
+// Reads a picture file to RGB (U8ZYX). At least 2 pixels and at most 16384 either way, 2^27 in all.
 Image readPicture(const std::string& path);
 
-// Writes U8ZYX or U8G as PNG, first beside its place and then into it, so that nothing half-written is left behind.
+// Writes U8ZYX or U8G as PNG, through an Output.
 void writePicture(const std::string& path, const Image& image);
-
-// Makes a folder, and those above it.
-void makeFolder(const std::string& path);
 
 // The picture's grey values (the mean of its channels), padding filled with each row's last pixel.
 Image greyOf(const Image& picture);

@@ -9,6 +9,7 @@
 #include <gtest/gtest.h>
 #include <jpeglib.h>
 #include <sstream>
+#include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
@@ -45,9 +46,9 @@ protected:
     std::string path(const std::string& name) const { return (m_folder / name).string(); }
 
     Outcome run(const std::string& program, const std::string& arguments) const {
-        const std::string command = "cd '" + m_folder.string() + "' && '" KEL_EXAMPLES_DIR "/" + program + "' " + arguments +
-                                    " > stdout.txt 2> stderr.txt";
-        const int status = std::system(command.c_str());
+        write("command", "cd '" + m_folder.string() + "'; exec > stdout.txt 2> stderr.txt; '" KEL_EXAMPLES_DIR "/" + program +
+                             "' " + arguments + "\n");
+        const int status = std::system(("bash '" + path("command") + "'").c_str());
         return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, contents(path("stdout.txt")), contents(path("stderr.txt"))};
     }
 
@@ -70,17 +71,18 @@ protected:
         write(name, bytes);
     }
 
-    void writeJpeg(const std::string& name, const Image& picture) const {
+    // In the printing colours the bytes stand for something else, which does not matter here.
+    void writeJpeg(const std::string& name, const Image& picture, bool cmyk = false) const {
         jpeg_compress_struct jpeg;
         jpeg_error_mgr errors;
         jpeg.err = jpeg_std_error(&errors);
         jpeg_create_compress(&jpeg);
         std::FILE* const file = std::fopen(path(name).c_str(), "wb");
         jpeg_stdio_dest(&jpeg, file);
-        jpeg.image_width = static_cast<JDIMENSION>(picture->width);
+        jpeg.image_width = static_cast<JDIMENSION>(cmyk ? picture->width / 2 : picture->width);
         jpeg.image_height = static_cast<JDIMENSION>(picture->height);
-        jpeg.input_components = 3;
-        jpeg.in_color_space = JCS_RGB;
+        jpeg.input_components = cmyk ? 4 : 3;
+        jpeg.in_color_space = cmyk ? JCS_CMYK : JCS_RGB;
         jpeg_set_defaults(&jpeg);
         jpeg_set_quality(&jpeg, 90, TRUE);
         jpeg_start_compress(&jpeg, TRUE);
@@ -203,6 +205,7 @@ TEST_F(Programs, RegisterAnswersBadInputWithOneLineAndWritesNothing) {
     const Scene scene = renderScene(3);
     writePicture(path("good.png"), scene.first);
     writeJpeg("good.jpg", scene.first);
+    writeJpeg("cmyk.jpg", scene.first, true);
     writePnm("good.ppm", scene.first, true);
     for (const char* name : {"good.png", "good.jpg", "good.ppm"})
         write(std::string("cut-") + name, contents(path(name)).substr(0, 5000));
@@ -226,13 +229,16 @@ TEST_F(Programs, RegisterAnswersBadInputWithOneLineAndWritesNothing) {
         {"empty.png good.png", "empty"},
         {"zero.pgm good.png", "0x5"},
         {"one.pgm good.png", "1x5"},
-        {"wide.pgm good.png", "20000x2"},
+        {"wide.pgm good.png", "20000x2 pixels is too large; at most 16384"},
         {"deep.pgm good.png", "8 bits"},
         {"header.pgm good.png", "header"},
         {"folder good.png", "folder"},
         {"good.png", "two pictures"},
         {"good.png good.png good.png", "pictures"},
+        {"cmyk.jpg good.png", "CMYK"},
+        {"/dev/zero good.png", "not a picture"},
         {"--threshold 0", "--threshold"},
+        {"--threshold nan", "--threshold"},
         {"--seed x", "--seed"},
         {"--nonsense", "--nonsense"},
         {"good.png good.png --output text.png", "text.png"},
@@ -287,11 +293,11 @@ TEST_F(Programs, StabilizeSteadiesFramesOfAnyWidth) {
     for (int width : {320, 333, 350, 400}) {
         const std::string size = std::to_string(width) + "x240", video = shakingVideo(scene.first, width, 240, 12);
         const size_t frameBytes = video.size() / 12;
-        write("in.uyvy", video + video.substr(0, frameBytes / 2)); // the last frame is cut off
+        write("in.uyvy", video);
         const Outcome toFile = run("stabilize", "--size " + size + " in.uyvy --output out.uyvy");
         EXPECT_EQ(toFile.status, 0) << toFile.err;
-        EXPECT_THAT(toFile.err, HasSubstr("incomplete"));
         EXPECT_THAT(toFile.err, HasSubstr("frames a second"));
+        EXPECT_EQ(std::count(toFile.err.begin(), toFile.err.end(), '\n'), 1) << "no progress but on a terminal";
         const std::string steadied = contents(path("out.uyvy"));
         EXPECT_EQ(steadied.size(), video.size());
         EXPECT_LT(shake(steadied, width, 240), shake(video, width, 240) / 3) << width;
@@ -302,21 +308,165 @@ TEST_F(Programs, StabilizeSteadiesFramesOfAnyWidth) {
     }
 }
 
+// The same frames as y4m: 4:2:2 comes out as UYVY does, 4:2:0 with the same brightness; --crop leaves the middle, without edges.
+TEST_F(Programs, StabilizeReadsAndWritesY4m) {
+    const int width = 333, height = 240, half = (width + 1) / 2;
+    const std::string video = shakingVideo(renderScene(21).first, width, height, 12);
+    write("in.uyvy", video);
+    ASSERT_EQ(run("stabilize", "--size 333x240 in.uyvy --output out.uyvy").status, 0);
+    const std::string steady = contents(path("out.uyvy"));
+    const auto planes = [&](const std::string& uyvy, const std::string& header, int rowsOfColour) {
+        std::string y4m = header;
+        const size_t row = static_cast<size_t>(half) * 4;
+        for (size_t frame = 0; frame < uyvy.size(); frame += row * height) {
+            y4m += "FRAME\n";
+            for (size_t y = 0; y < height; ++y)
+                for (size_t x = 0; x < width; ++x)
+                    y4m += uyvy[frame + y * row + 2 * x + 1];
+            for (const size_t plane : {0, 2})
+                for (size_t y = 0; y < height; y += static_cast<size_t>(rowsOfColour))
+                    for (size_t x = 0; x < half; ++x)
+                        y4m += uyvy[frame + y * row + 4 * x + plane];
+        }
+        return y4m;
+    };
+    const std::string h422 = "YUV4MPEG2 W333 H240 F30:1 Ip A1:1 C422\n", h420 = "YUV4MPEG2 W333 H240 F25:1 C420jpeg XKEEP=1\n";
+    write("422.y4m", planes(video, h422, 1));
+    write("420.y4m", planes(video, h420, 2));
+    EXPECT_EQ(run("stabilize", "422.y4m").out, planes(steady, h422, 1));
+    const std::string out420 = run("stabilize", "--size 333x240 < 420.y4m").out, expected420 = planes(steady, h420, 2);
+    ASSERT_EQ(out420.size(), expected420.size());
+    EXPECT_EQ(out420.substr(0, h420.size() + 6 + width * height), expected420.substr(0, h420.size() + 6 + width * height));
+
+    const Outcome cropped = run("stabilize", "--crop 0.1 422.y4m");
+    EXPECT_THAT(cropped.err, HasSubstr("cut to 269x192"));
+    const size_t header = cropped.out.find('\n') + 1, frame = 6 + 192 * (269 + 2 * 135);
+    EXPECT_EQ(cropped.out.substr(0, header), "YUV4MPEG2 W269 H192 F30:1 Ip A1:1 C422\n");
+    ASSERT_EQ(cropped.out.size(), header + 12 * frame);
+    for (size_t at = header; at < cropped.out.size(); at += frame)
+        EXPECT_EQ(cropped.out.find('\0', at), std::string::npos) << "empty corners would be black";
+}
+
 TEST_F(Programs, StabilizeAnswersBadInputWithOneLineAndWritesNothing) {
-    write("short.uyvy", "abc");
-    write("frame.uyvy", std::string(64 * 48 * 2, 'x'));
-    for (const char* arguments :
-         {"short.uyvy --size 64x48", "missing --size 64x48", "frame.uyvy --size 64", "frame.uyvy --size 64x48x2", "frame.uyvy",
-          "frame.uyvy --size 1x48", "frame.uyvy --size 99999x48", ". --size 64x48", "frame.uyvy --size 64x48 --output .",
-          "frame.uyvy --size 64x48 --output /proc/nowhere"}) {
+    const std::string bytes(64 * 48 * 2, 'x'), y4m = "YUV4MPEG2 W64 H48 F30:1";
+    const std::pair<const char*, std::string> files[] = {
+        {"short.uyvy", "abc"},
+        {"empty.uyvy", ""},
+        {"frame.uyvy", bytes},
+        {"half.uyvy", bytes + bytes.substr(9)},
+        {"clip.mp4", std::string("\0\0\0\x20", 4) + "ftypisom" + bytes.substr(12)},
+        {"clip.ts", "G" + std::string(187, 'x') + "G" + std::string(187, 'x') + "G" + bytes.substr(377)},
+        {"deep.y4m", y4m + " C420p10\nFRAME\n" + bytes},
+        {"fields.y4m", y4m + " It\nFRAME\n" + bytes},
+        {"cut.y4m", y4m + " C422\nFRAME\n" + bytes + "FRAME\n" + bytes.substr(9)},
+        {"none.y4m", y4m + "\n"},
+        {"open.y4m", y4m},
+    };
+    for (const auto& [name, content] : files)
+        write(name, content);
+    const struct {
+        const char *arguments, *text;
+    } cases[] = {
+        {"short.uyvy --size 64x48", "no whole number"},
+        {"--size 64x48 < empty.uyvy", "no whole number"},
+        {"half.uyvy --size 64x48", "no whole number"},
+        {"--size 64x48 < half.uyvy", "no whole number"},
+        {"--size 64x48 - < <(cat half.uyvy)", "frame 2 is incomplete"},
+        {"missing --size 64x48", "missing"},
+        {"frame.uyvy --size 64", "64"},
+        {"frame.uyvy --size 64x48x2", "64x48x2"},
+        {"frame.uyvy", "--size"},
+        {"frame.uyvy --size 1x48", "1x48"},
+        {"frame.uyvy --size 99999x48", "99999x48"},
+        {"frame.uyvy --size 64x48 --crop nan", "--crop"},
+        {". --size 64x48", "folder"},
+        {"frame.uyvy --size 64x48 --output .", "folder"},
+        {"frame.uyvy --size 64x48 --output /proc/nowhere", "No such file"},
+        {"clip.mp4 --size 64x48", "MP4"},
+        {"clip.ts --size 64x48", "transport stream"},
+        {"deep.y4m", "420p10"},
+        {"fields.y4m", "interlaced"},
+        {"cut.y4m", "frame 2"},
+        {"none.y4m", "no frame"},
+        {"open.y4m", "no end"},
+        {"cut.y4m --size 32x48", "64x48, not 32x48"},
+    };
+    for (const auto& c : cases) {
         const Outcome result =
-            run("stabilize", arguments + std::string(std::strstr(arguments, "output") ? "" : " --output out"));
-        EXPECT_EQ(result.status, 1) << arguments;
+            run("stabilize", c.arguments + std::string(std::strstr(c.arguments, "output") ? "" : " --output out"));
+        EXPECT_EQ(result.status, 1) << c.arguments;
+        EXPECT_THAT(result.err, HasSubstr(c.text)) << c.arguments;
         EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
         EXPECT_FALSE(fs::exists(path("out")));
     }
     EXPECT_EQ(run("stabilize", "frame.uyvy --size 64x48 --output out").status, 0) << "one frame without features";
     EXPECT_EQ(contents(path("out")), contents(path("frame.uyvy")));
+    std::string yuyv = shakingVideo(renderScene(21).first, 320, 240, 1);
+    for (size_t i = 0; i < yuyv.size(); i += 2)
+        std::swap(yuyv[i], yuyv[i + 1]);
+    write("in.yuyv", yuyv);
+    EXPECT_THAT(run("stabilize", "in.yuyv --size 320x240 --output out").err, HasSubstr("look like YUYV"));
+}
+
+// Links stay, what is no regular file is written into, modes are kept; nothing else remains in the folder.
+TEST_F(Programs, WriteIntoWhatIsNoRegularFileAndThroughLinks) {
+    const std::string video = shakingVideo(renderScene(21).first, 320, 240, 3), call = "--size 320x240 in.uyvy --output ";
+    write("in.uyvy", video);
+    ASSERT_EQ(run("stabilize", "--size 320x240 in.uyvy --output plain").status, 0);
+    const std::string steady = contents(path("plain"));
+    fs::create_directory(path("elsewhere"));
+    write("elsewhere/old", "old");
+    fs::permissions(path("elsewhere/old"), fs::perms(0640));
+    fs::create_symlink("elsewhere/old", path("link"));
+    fs::create_symlink("elsewhere/new", path("dangling"));
+    ASSERT_EQ(mkfifo(path("pipe").c_str(), 0600), 0);
+    EXPECT_EQ(run("stabilize", call + "link").status, 0);
+    EXPECT_EQ(run("stabilize", call + "dangling").status, 0);
+    EXPECT_EQ(run("stabilize", call + "pipe & cat pipe > read; wait").status, 0);
+    EXPECT_EQ(run("stabilize", call + "/dev/stdout").out, steady);
+    EXPECT_EQ(contents(path("elsewhere/old")), steady);
+    EXPECT_EQ(contents(path("elsewhere/new")), steady);
+    EXPECT_EQ(contents(path("read")), steady);
+    EXPECT_TRUE(fs::is_symlink(path("link")) && fs::is_symlink(path("dangling")));
+    EXPECT_TRUE(fs::is_fifo(path("pipe")));
+    EXPECT_EQ(fs::status(path("elsewhere/old")).permissions(), fs::perms(0640));
+
+    fs::create_directory(path("kel-out"));
+    fs::create_symlink("../mosaic", path("kel-out/mosaic.png"));
+    EXPECT_EQ(run("register", "").status, 0);
+    EXPECT_TRUE(fs::is_symlink(path("kel-out/mosaic.png")));
+    EXPECT_NO_THROW(readPicture(path("mosaic")));
+    for (const auto& entry : fs::recursive_directory_iterator(m_folder))
+        EXPECT_NE(entry.path().filename().string().substr(0, 5), ".kel-") << entry;
+}
+
+TEST_F(Programs, SayWhereResultsAreLost) {
+    write("in.uyvy", shakingVideo(renderScene(21).first, 320, 240, 12));
+    fs::create_directory(path("sets"));
+    write("sets/a_pts.txt", "0 0 1 0 0 1 1\n0 0 1 0 0 1 0\n");
+    const std::pair<const char*, const char*> programs[] = {{"register", ""},
+                                                            {"calibrate", ""},
+                                                            {"robustness", "sets --seeds 2"},
+                                                            {"register", "--help"},
+                                                            {"stabilize", "--size 320x240 in.uyvy"}};
+    for (const auto& [program, arguments] : programs)
+        for (const char* to : {" > /dev/full", " >&-"}) {
+            const Outcome result = run(program, std::string(arguments) + to);
+            EXPECT_EQ(result.status, 1) << program << arguments << to;
+            EXPECT_THAT(result.err, HasSubstr("standard output: cannot be written: ")) << program << arguments << to;
+        }
+}
+
+TEST_F(Programs, LeaveNothingBehindWhenInterrupted) {
+    write("in.uyvy", shakingVideo(renderScene(21).first, 320, 240, 12));
+    write("out", "old");
+    for (const char* signal : {"INT", "TERM", "HUP"}) {
+        const std::string command = "cd '" + m_folder.string() + "' && (cat in.uyvy; sleep 1) | (timeout -s " + signal +
+                                    " 0.5 '" KEL_EXAMPLES_DIR "/stabilize' --size 320x240 --output out; true)";
+        EXPECT_EQ(std::system(command.c_str()), 0);
+        EXPECT_EQ(contents(path("out")), "old");
+        EXPECT_EQ(std::distance(fs::directory_iterator(m_folder), fs::directory_iterator()), 2) << signal;
+    }
 }
 
 TEST_F(Programs, CalibrateRecoversTheCamera) {
@@ -339,8 +489,8 @@ TEST_F(Programs, CalibrateRecoversTheCamera) {
         }
     EXPECT_EQ(parameters, 8);
     EXPECT_EQ(run("calibrate", "--outliers 1").status, 2);
-    for (const char* arguments :
-         {"--pairs 5", "--pairs 10001", "--noise -1", "--outliers 1.5", "--output /proc/nowhere", "extra"})
+    for (const char* arguments : {"--pairs 5", "--pairs 10001", "--noise nan", "--outliers nan", "--noise -1", "--outliers 1.5",
+                                  "--output /proc/nowhere", "extra"})
         EXPECT_EQ(run("calibrate", arguments).status, 1) << arguments;
 }
 
