@@ -102,9 +102,9 @@ enum kelPixelType_e {
  * `data` of a header-only image excepted.
  *
  * Pixel (x, y) starts at byte (y * step + x) * channels * depth of `data`. Pixels width .. step-1 of a row are padding:
- * memory of the image that belongs to no pixel. Creation leaves it indeterminate, vector functions may write it, and
- * contrast stretching reads it; each function says so where it does. Rows are padded to 16 pixels so that
- * vector functions need no code for row ends.
+ * memory of the image that belongs to no pixel. Creation leaves it indeterminate, vector functions may write it, and in some
+ * it reaches pixels: contrast stretching, and at some widths YUV to colour, adaptive threshold, 7x7 and the cross operator;
+ * each says where. Rows are padded to 16 pixels so that vector functions need no code for row ends.
  */
 typedef struct kelImage_t_ {
     kelValue_s32 reserved; /**< Neither written nor read by the library; indeterminate after creation. */
@@ -121,7 +121,8 @@ typedef struct kelImage_t_ {
 
 /**
  * Creates a record without pixels; the caller points `data` at memory of its own, laid out with the record's `step`, and
- * releases the record with releaseKelImageHeader(). `reserved`, `data` and `buffer` are left unset.
+ * releases the record with releaseKelImageHeader(). `reserved`, `data` and `buffer` are left unset. That memory has to be
+ * aligned for its elements (S16G to 2 bytes, four channels of one byte to 4) and no more.
  *
  * Nothing is validated: a type outside 0..47 gives channels, depth and size 0. `step` and `size` are formed in 32-bit
  * arithmetic that wraps. A failed allocation is not detected.
@@ -251,7 +252,7 @@ KEL_API void convertKelImage(kelImage_t* dst, const kelImage_t* src);
  * @name Portable converters
  * For each pixel (x, y) of the destination's width and height, rows by either image's own step; s0 .. s3 and d0 .. d3 are the
  * channels in memory order, s a grey source. Nothing is checked: neither types nor sizes. Padding is neither read nor written,
- * YUV and grey sources excepted (below). Where source and destination pixels have equally many channels both may be the same
+ * YUV and grey sources excepted (below). Where source and destination pixels have equally many bytes both may be the same
  * memory.
  *
  *  - S16G_to_U8G, S16G_to_U8XYZ, S16G_to_U8XYZA: d0 (= d1 = d2) = low 8 bits of abs(s) >> 7: the magnitude by 1/128,
@@ -265,7 +266,8 @@ KEL_API void convertKelImage(kelImage_t* dst, const kelImage_t* src);
  *  - U8YUV_to_U8RGB writes R, G, B, U8YUV_to_U8BGR writes B, G, R. In single precision, each product and each sum rounded by
  *    the thread's rounding mode, with C = (Y - 16) * 1.164f, U' = U - 128, V' = V - 128:
  *    R = C + 1.793f * V', G = (C + -0.213f * U') + -0.534f * V', B = C + 2.115f * U'; then limited to 0 .. 255 and truncated.
- *    Pixels come in pairs U, Y0, V, Y1. At odd widths the last pair still writes both pixels, the second into the padding.
+ *    Pixels come in pairs U, Y0, V, Y1. At odd widths the last pair still writes both pixels, the second into the padding, and
+ *    THE LAST PIXEL'S V IS READ FROM THE PADDING of the source: fill it, or red and green of that column are anyone's guess.
  *  - The other six forward to the vector converter of the same name, and write the padding as it does.
  * @{
  */
@@ -304,6 +306,7 @@ KEL_API void convertKelImage_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src)
  *  - U8YUV_to_U8RGBA writes R, G, B, 0, U8YUV_to_U8BGRA writes B, G, R, 0. As the portable form, with two differences:
  *    G = C + (-0.213f * U' + -0.534f * V'), and the sums are rounded to integers by the thread's rounding mode (to nearest,
  *    ties to even, unless it was changed), then limited to 0 .. 255. So a channel can differ by one from the three-channel form.
+ *    At odd widths the last pixel's V is read from the padding, as there.
  *
  * @warning Rows of these two follow each other without a gap, width rounded up to 4 pixels apart, in the source and in the
  * destination. That is the images' own layout only where width % 16 is 0, 13, 14 or 15; at any other width row y is taken
@@ -389,8 +392,9 @@ KEL_API void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kel
  *
  * Written are rows 16 .. height-17 and the columns from 16 on, in blocks of 16 as long as a block starts before width - 16.
  * EVERYTHING ELSE KEEPS WHAT `dst` HELD: clear it first where that matters. The means along rows come in blocks of 8, followed
- * by zeros: where width % 16 is 1 .. 8 the last 8 columns written are compared with means of 0 and turn 255. Images of a width
- * or height up to 32 leave `dst` unchanged (and of a width up to 32 `tmp`, too).
+ * by zeros: where width % 16 is 1 .. 8 the last 8 columns written are compared with means of 0 and turn 255. Where width % 8 is
+ * 1, 2 or 3 the last means take in up to three pixels of the source's padding. Images of a width or height up to 32 leave `dst`
+ * unchanged (and of a width up to 32 `tmp`, too).
  *
  * binalizeKelImageAdaptive() checks and leaves images of other types alone; the two it calls check nothing. `dst` and `src` may
  * be the same image.
@@ -592,7 +596,10 @@ KEL_API void resizeKelImage(kelImage_t* dst, const kelImage_t* src);
 /**
  * Nearest sample at whole-number ratios: dst(x, y) = src(trunc((x + 0.5) rx), trunc((y + 0.5) ry)) with rx = src->width /
  * dst->width and ry = src->height / dst->height, integer divisions. An enlargement has ratio 0 and repeats pixel
- * (0, 0). Rows by `width`, see above. A destination without width or height divides by zero.
+ * (0, 0). Rows by `width`, see above. A destination without width or height divides by zero; one of negative size is left alone.
+ *
+ * Positions are formed in single precision: in sources of 2^23 rows or columns and more they are rounded, and the last may be that
+ * behind the source.
  * Stops the process on "dst->type == src->type".
  */
 KEL_API void resizeKelImageNearest(kelImage_t* dst, const kelImage_t* src);
@@ -601,7 +608,8 @@ KEL_API void resizeKelImageNearest(kelImage_t* dst, const kelImage_t* src);
  * Bilinear sample of a U8G image at whole-number ratios, at the positions of resizeKelImageNearest() before truncation,
  * rounded half up: even ratios pick one pixel, odd ones average the four from ((x + 0.5) rx, (y + 0.5) ry) on. The neighbour
  * of the last column or row is itself. Rows by `width`, see above. A destination without width or height divides by zero,
- * before the check. Other types are ignored. Stops the process on "dst->type == src->type".
+ * before the check; one of negative size is left alone. Sources of 2^23 rows or columns and more: as in
+ * resizeKelImageNearest(). Other types are ignored. Stops the process on "dst->type == src->type".
  */
 KEL_API void resizeKelImageBilinear(kelImage_t* dst, const kelImage_t* src);
 
@@ -635,7 +643,9 @@ KEL_API void zero_order_hold_plus_ave(kelImage_t* dst, const kelImage_t* src);
  *
  * U8G and S16G address rows by `step`, types of three and four bytes by `width` (densely packed). For S16G the right border
  * starts at column src->step + size and repeats column src->step + size - 1: with a source width that is no multiple of 16 the
- * true right border stays as it was and the band lands further on in memory, never beyond dst->size bytes.
+ * true right border stays as it was, and the band lands further on in memory. Where it does not end in the row's padding IT
+ * OVERWRITES PIXELS OF THE ROW BEHIND, the first of them its left border, and where size > src->step - src->width the right border
+ * as well; it never leaves the rows of `dst`.
  * Stops the process on "dst->type == src->type" and
  * "dst->width == src->width +2*size && dst->height == src->height + 2*size".
  */

@@ -25,7 +25,8 @@
  * A dense row-major matrix of floats that owns its elements: element (r, c) is m_Data[r * m_Width + c], or M[r][c].
  *
  * A matrix is either empty (0 x 0, no storage, m_IsCreated false) or created. Copies are deep. Do not assign a matrix to
- * itself: its elements would be indeterminate. An output must be another matrix than *this and the other arguments.
+ * itself: its elements would be indeterminate. An output must be another matrix than *this and the other arguments; only
+ * decompositions, eigenproblems, angles and inverses take their inputs before they write.
  * Allocation failure is not detected. A matrix has no lock; different matrices may be used from different threads.
  */
 class kelMat {
@@ -163,7 +164,7 @@ public:
     /// @{
     /// Camera decomposition P ~ A [R | T] of a 3x4 projection, by Gram-Schmidt on its rows from the last: A 3x3 upper
     /// triangular with A[2][2] = 1 and non-negative diagonal, R 3x3 with orthonormal rows (its determinant may be -1), T 3x1
-    /// with T[2] >= 0. P and -P give the same. Always true; degenerate input gives infinities or NaN. Stops on
+    /// with T[2] >= 0. P and -P give the same, unless P[2][3] is 0: then the sign of P goes to R and T. Always true; degenerate input gives infinities or NaN. Stops on
     /// "this->m_Width == 4 && this->m_Height == 3".
     KEL_API bool getDecomposedMatrix_ART_3x4(kelMat& A, kelMat& R, kelMat& T) const;
     /// Decomposition of a plane homography l K [r1 r2 t], K = diag(f, f, 1): A is diag(f, f, 0), with a zero where K has its
@@ -180,8 +181,9 @@ public:
     /// Eigenvalues (n x 1, not sorted) and eigenvectors (columns) of a symmetric matrix, by nr_jacobi() on a copy. Always true.
     KEL_API bool getEigenValue(kelMat& d, kelMat& v);
     /// Solves (this) x = lambda B x, this matrix symmetric and B symmetric positive definite, through the Cholesky factor of B
-    /// and nr_jacobi(): eigenvalues (n x 1, not sorted), B-orthonormal eigenvectors (columns). Always true; where B cannot be
-    /// factored d and X may come out empty or NaN. Stops as getInversedMatrix() does for n below 2.
+    /// and nr_jacobi(): eigenvalues (n x 1, not sorted), B-orthonormal eigenvectors (columns). Always true: where B is not positive
+    /// definite d and X come out empty, NaN or, mostly, finite and WRONG, which nothing tells. Stops as getInversedMatrix() does
+    /// where B is not square or its order is below 2, and as the product of matrices where this matrix is of another size.
     KEL_API bool getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X);
     /// @}
 
@@ -230,8 +232,8 @@ KEL_API float nr_pythag(float a, float b);
 /**
  * Singular value decomposition a = u w v^T by Householder bidiagonalisation and implicit-shift QR (Golub and Reinsch,
  * Singular value decomposition and least squares solutions, 1970). For a of m x n: u m x n, w n x n diagonal,
- * non-negative and not sorted, v n x n (not its transpose). m may be below n. False where a value needed 30 iterations, as with
- * NaN in the input.
+ * non-negative and not sorted, v n x n (not its transpose). m may be below n. False where a value needed 30 iterations. NaN in
+ * the input does that from two columns on; with one column, and with fewer rows than columns, it may come out true.
  *
  * Works in single precision throughout: squares must stay in its range, and a rank far below n may leave NaN in v, as what
  * remains of the matrix sinks below that range step by step.
@@ -367,7 +369,9 @@ public:
     KEL_API bool estimate_byLSM_fine(kelMatCorrespP& corresp);
     /// Taubin's method with three rows a pair, coordinates as they are; see kelMatEstimatorH::estimate_byTaubin() for noise and
     /// degenerate pairs. Prints the blocks "M", "N", "eigenvalue" and "result" with their matrices to standard output. Among the
-    /// eigenvalues the first counts as it is, later ones as magnitudes truncated to an integer. False, and nothing written
+    /// eigenvalues the first counts as it is, later ones as magnitudes truncated to an integer; one that no int holds is never
+    /// taken, though about every second set of points has such a one, and the best fit with it: prefer
+    /// estimate_byLSM_fine(). False, and nothing written
     /// or printed, below six pairs.
     KEL_API bool estimate_byTaubin(kelMatCorrespP& corresp);
     /// Robust fit by RANSAC, as kelMatEstimatorH::estimate_byRANSAC_fine() with samples of six, at most 1500 candidates and none
