@@ -10,16 +10,11 @@
 
 namespace kel_test {
 
-// `file` is the path below the project's root; the line number is any. Only GCC spells signatures the library's own way.
+// `file` is the path below the project's root; the line number is any.
 inline testing::Matcher<const std::string&> report(const std::string& text, const std::string& file,
                                                    const std::string& signature) {
-    const std::string failed = "Assertion `" + text + "' failed.";
-#ifdef __clang__
-    (void)signature;
-    return testing::AllOf(testing::HasSubstr(" " + file + ":"), testing::HasSubstr(failed));
-#else
-    return testing::AllOf(testing::HasSubstr(" " + file + ":"), testing::HasSubstr(": " + signature + ": " + failed));
-#endif
+    return testing::AllOf(testing::HasSubstr(" " + file + ":"),
+                          testing::HasSubstr(": " + signature + ": Assertion `" + text + "' failed."));
 }
 
 } // namespace kel_test
