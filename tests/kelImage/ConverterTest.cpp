@@ -11,7 +11,6 @@
 #include "Stops.h"
 #include "Sweep.h"
 #include "Valgrind.h"
-#include "kelImage_YuvWide.h"
 
 using kel_test::Bytes;
 using kel_test::Fill;
@@ -244,39 +243,6 @@ TEST(Converter, YuvFollowsTheThreadsRoundingMode) {
                 std::fesetround(FE_TONEAREST);
                 EXPECT_TRUE(holds(dst, expected)) << c.name << ", rounding " << mode.name;
             }
-}
-
-// The variants for wider vectors, each by itself where this processor has it, over the last pixels of every group.
-TEST(Converter, YuvVariantsOfEveryWidthGiveTheSameBytes) {
-    const struct {
-        kel::YuvRun run;
-        bool present;
-        ptrdiff_t block;
-    } variants[] = {{kel::yuvToFourChannels128, true, 8},
-                    {kel::yuvToFourChannels256, static_cast<bool>(__builtin_cpu_supports("avx2")), 16},
-                    {kel::yuvToFourChannels512, __builtin_cpu_supports("avx512f") && __builtin_cpu_supports("avx512bw"), 32}};
-    for (const auto& variant : variants)
-        for (const int mode : {FE_TONEAREST, FE_UPWARD, FE_DOWNWARD, FE_TOWARDZERO})
-            for (int width = 4; variant.present && width <= 272; width += 4)
-                for (const bool blueFirst : {false, true}) {
-                    std::fesetround(mode);
-                    const int type = blueFirst ? KEL_PIXEL_TYPE_U8XYZA : KEL_PIXEL_TYPE_U8ZYXA;
-                    Image src(width, 1, KEL_PIXEL_TYPE_U8YUV), dst(width, 1, type), expected(width, 1, type);
-                    src.fill(Fill::Random, static_cast<uint32_t>(width + mode));
-                    const ptrdiff_t done = width / variant.block * variant.block;
-                    Image part(static_cast<int>(done), 1, type);
-                    (blueFirst ? kel_ref::U8YUV_to_U8BGRA : kel_ref::U8YUV_to_U8RGBA)(expected.get(), src.get());
-                    uint8_t* d = part->data;
-                    const uint8_t* s = src->data;
-                    const ptrdiff_t rest = variant.run(d, s, width, blueFirst);
-                    std::fesetround(FE_TONEAREST);
-                    EXPECT_EQ(rest, width - done);
-                    EXPECT_EQ(s - src->data, 2 * done);
-                    EXPECT_EQ(d - part->data, 4 * done);
-                    EXPECT_TRUE(part.marginIntact());
-                    EXPECT_EQ(Bytes(part->data, d), Bytes(expected->data, expected->data + 4 * done))
-                        << width << " by " << variant.block;
-                }
 }
 
 TEST(Dispatcher, RoutesEveryPairOfTypes) {

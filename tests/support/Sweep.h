@@ -12,7 +12,7 @@ inline std::vector<int> widths() {
     std::vector<int> all = {-3, 0};
     for (int width = 1; width <= 70; ++width)
         all.push_back(width);
-    for (int width : {95, 96, 97, 127, 128, 129, 200})
+    for (int width : {95, 96, 97, 127, 128, 129, 200, 255, 256, 257, 331})
         all.push_back(width);
     return all;
 }

@@ -1,0 +1,9 @@
+// The kernels for processors with SSE4.1, 16 bytes at a time.
+#include "kelImage_Lanes_sse41.h"
+
+namespace {
+using Wide = Lanes1;
+}
+#define KEL_KERNELS_OF sse41
+
+#include "kelImage_KernelTable.h"
