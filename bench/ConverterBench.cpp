@@ -1,6 +1,8 @@
 // Converters beside OpenCV and libyuv.
 #include "ImagePeers.h"
 
+#include <algorithm>
+
 namespace {
 
 using namespace kel_bench;
@@ -24,8 +26,22 @@ Call planes(Convert convert) {
     };
 }
 #define KEL_PLANES(name) planes(libyuv::name)
+// Two steps, the first into an image of four channels, a row of pixels at a time as far as libyuv's own cache goes.
+Call planesByFour(Convert first, Convert second) {
+    return [=, four = ImagePointer()](kelImage_t* d, const kelImage_t* s) mutable {
+        if (!four)
+            four = image(d->width, 16, KEL_PIXEL_TYPE_U8XYZA);
+        for (int y = 0; y < d->height; y += four->height) {
+            const int rows = std::min(four->height, d->height - y), from = s->step * s->channels, to = d->step * d->channels;
+            first(s->data + y * from, from, four->data, 4 * four->step, d->width, rows);
+            second(four->data, 4 * four->step, d->data + y * to, to, d->width, rows);
+        }
+    };
+}
+#define KEL_PLANES_BY_FOUR(first, second) planesByFour(libyuv::first, libyuv::second)
 #else
 #define KEL_PLANES(name) Call()
+#define KEL_PLANES_BY_FOUR(first, second) Call()
 #endif
 
 void addLines() {
@@ -61,18 +77,20 @@ void addLines() {
     addPixelLines("convert U8XYZA to U8ZYXA", rgba, bgra, convertKelImage_U8XYZA_to_U8ZYXA, {KEL_COLOUR(COLOR_BGRA2RGBA)},
                   {KEL_PLANES(ARGBToABGR)});
     // The grey lands three pixels apart, so the destination gets the room of three channels.
-    addPixelLines("convert U8XYZA to U8G", bgr, bgra, convertKelImage_U8XYZA_to_U8G, {}, {});
+    const std::string packed = "weighted grey, packed";
+    addPixelLines("convert U8XYZA to U8G", bgr, bgra, convertKelImage_U8XYZA_to_U8G, {}, {KEL_PLANES(ARGBToJ400), packed});
     addPixelLines("convert U8YUV to U8G", g, yuv, convertKelImage_U8YUV_to_U8G, {KEL_COLOUR(COLOR_YUV2GRAY_UYVY)},
                   {KEL_PLANES(UYVYToY)});
     addPixelLines("convert U8YUV to U8BGR", bgr, yuv, convertKelImage_U8YUV_to_U8BGR,
-                  {KEL_COLOUR(COLOR_YUV2BGR_UYVY), fixedPoint}, {});
+                  {KEL_COLOUR(COLOR_YUV2BGR_UYVY), fixedPoint}, {KEL_PLANES_BY_FOUR(UYVYToARGB, ARGBToRGB24), fixedPoint});
     addPixelLines("convert U8YUV to U8RGB", rgb, yuv, convertKelImage_U8YUV_to_U8RGB,
-                  {KEL_COLOUR(COLOR_YUV2RGB_UYVY), fixedPoint}, {});
+                  {KEL_COLOUR(COLOR_YUV2RGB_UYVY), fixedPoint}, {KEL_PLANES_BY_FOUR(UYVYToARGB, ARGBToRAW), fixedPoint});
     addPixelLines("convert U8YUV to U8BGRA", bgra, yuv, convertKelImage_U8YUV_to_U8BGRA,
                   {KEL_COLOUR(COLOR_YUV2BGRA_UYVY), fixedPoint}, {KEL_PLANES(UYVYToARGB), fixedPoint});
     addPixelLines("convert U8YUV to U8RGBA", rgba, yuv, convertKelImage_U8YUV_to_U8RGBA,
-                  {KEL_COLOUR(COLOR_YUV2RGBA_UYVY), fixedPoint}, {});
-    addPixelLines("convert U8G to U8XYZ", bgr, g, convertKelImage_U8G_to_U8XYZ, {KEL_COLOUR(COLOR_GRAY2BGR)}, {});
+                  {KEL_COLOUR(COLOR_YUV2RGBA_UYVY), fixedPoint}, {KEL_PLANES_BY_FOUR(UYVYToARGB, ARGBToABGR), fixedPoint});
+    addPixelLines("convert U8G to U8XYZ", bgr, g, convertKelImage_U8G_to_U8XYZ, {KEL_COLOUR(COLOR_GRAY2BGR)},
+                  {KEL_PLANES_BY_FOUR(J400ToARGB, ARGBToRGB24)});
     addPixelLines("convert U8G to U8XYZA", bgra, g, convertKelImage_U8G_to_U8XYZA, {KEL_COLOUR(COLOR_GRAY2BGRA), opaque},
                   {KEL_PLANES(J400ToARGB), opaque});
     addPixelLines("convert U8G to S16G", s16, g, convertKelImage_U8G_to_S16G, {toShort}, {});

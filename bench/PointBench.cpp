@@ -11,6 +11,13 @@ void addLines() {
         cv::Mat to = mat(d);
         cv::normalize(mat(s), to, 0, 255, cv::NORM_MINMAX);
     });
+    const Call scaled = KEL_OPENCV([](kelImage_t* d, const kelImage_t* s) {
+        cv::Mat to = mat(d);
+        double least, greatest;
+        cv::minMaxLoc(mat(s), &least, &greatest);
+        const double scale = 255 / (greatest - least);
+        mat(s).convertTo(to, CV_8U, scale, -least * scale);
+    });
     const Call threshold = KEL_OPENCV([](kelImage_t* d, const kelImage_t* s) {
         cv::Mat to = mat(d);
         cv::threshold(mat(s), to, 127, 255, cv::THRESH_BINARY);
@@ -19,7 +26,8 @@ void addLines() {
         cv::Mat to = mat(d);
         cv::adaptiveThreshold(mat(s), to, 255, cv::ADAPTIVE_THRESH_MEAN_C, cv::THRESH_BINARY, 25, 0);
     });
-    addPixelLines("adjustKelImage", g, g, adjustKelImage, {normalize, "double-precision scale and shift"}, {});
+    addPixelLines("adjustKelImage", g, g, adjustKelImage, {normalize, "double-precision scale and shift"},
+                  {scaled, "single-precision scale and shift"});
     addPixelLines("binalizeKelImage", g, g, [](kelImage_t* d, const kelImage_t* s) { binalizeKelImage(d, s, 128); },
                   {threshold}, {});
     addPixelLines("binalizeKelImageAdaptive", g, g,

@@ -36,14 +36,24 @@ ImageSize same(const ImageSize& s) {
 ImageSize halved(const ImageSize& s) {
     return {s.width / 2, s.height / 2, ""};
 }
+ImageSize third(const ImageSize& s) {
+    return {s.width / 3, s.height / 3, ""};
+}
 ImageSize doubled(const ImageSize& s) {
     return {s.width * 2, s.height * 2, ""};
 }
 ImageSize twoThirds(const ImageSize& s) {
     return {s.width * 2 / 3, s.height * 2 / 3, ""};
 }
+ImageSize threeHalves(const ImageSize& s) {
+    return {s.width * 3 / 2, s.height * 3 / 2, ""};
+}
 ImageSize bordered(const ImageSize& s) {
     return {s.width + 32, s.height + 32, ""};
+}
+
+ImageSize cropSize(const ImageSize& s) {
+    return {s.width - 32, s.height - 32, ""};
 }
 
 const float kWarp[9] = {0.95f, 0.05f, 12.f, -0.04f, 0.97f, 25.f, 1e-5f, -2e-5f, 1.f};
@@ -72,6 +82,16 @@ Call resizeCv(int method) {
 #endif
 #if KEL_BENCH_LIBYUV
 #define LIBYUV(...) Call(__VA_ARGS__)
+template <bool mirrored> void turned4(kelImage_t* d, const kelImage_t* s) {
+    (mirrored ? libyuv::ARGBMirror : libyuv::ARGBCopy)(s->data, 4 * s->step, d->data, 4 * d->step, s->width, -s->height);
+}
+template <libyuv::FilterMode filter> void scaled4(kelImage_t* d, const kelImage_t* s) {
+    libyuv::ARGBScale(s->data, 4 * s->step, s->width, s->height, d->data, 4 * d->step, d->width, d->height, filter);
+}
+template <int bytes> void cropped(kelImage_t* d, const kelImage_t* s) {
+    libyuv::CopyPlane(s->data + 16 * bytes * (s->step + 1), bytes * s->step, d->data, bytes * d->step, bytes * d->width,
+                      d->height);
+}
 #else
 #define LIBYUV(...) Call()
 #endif
@@ -93,6 +113,10 @@ std::vector<Case> cases() {
         cv::copyMakeBorder(mat(s), to, 16, 16, 16, 16, cv::BORDER_REPLICATE);
     });
     const Call cropKel = [](kelImage_t* d, const kelImage_t* s) { resizeKelImageDeborder(d, s, 16); };
+    const Call cropCv = OPENCV([](kelImage_t* d, const kelImage_t* s) {
+        cv::Mat to = mat(d);
+        mat(s)(cv::Rect(16, 16, d->width, d->height)).copyTo(to);
+    });
     return {
         {"rotateKelImageH, 1 byte", 0, same, rotateKelImageH, OPENCV(flipCv(1)), "",
          LIBYUV([](kelImage_t* d, const kelImage_t* s) {
@@ -116,8 +140,19 @@ std::vector<Case> cases() {
          }),
          ""},
         {"rotateKelImageV, 3 bytes", 8, same, rotateKelImageV, OPENCV(flipCv(0)), "", {}, ""},
-        {"rotateKelImageVH, 1 byte", 0, same, rotateKelImageVH, OPENCV(flipCv(-1)), "", {}, ""},
-        {"rotateKelImageVH, 3 bytes", 8, same, rotateKelImageVH, OPENCV(flipCv(-1)), "", {}, ""},
+        {"rotateKelImageV, 4 bytes", 16, same, rotateKelImageV, OPENCV(flipCv(0)), "", LIBYUV(turned4<false>), ""},
+        {"rotateKelImageVH, 1 byte", 0, same, rotateKelImageVH, OPENCV(flipCv(-1)), "",
+         LIBYUV([](kelImage_t* d, const kelImage_t* s) {
+             libyuv::MirrorPlane(s->data, s->step, d->data, d->step, s->width, -s->height);
+         }),
+         ""},
+        {"rotateKelImageVH, 2 bytes", 3, same, rotateKelImageVH, OPENCV(flipCv(-1)), "", {}, ""},
+        {"rotateKelImageVH, 3 bytes", 8, same, rotateKelImageVH, OPENCV(flipCv(-1)), "",
+         LIBYUV([](kelImage_t* d, const kelImage_t* s) {
+             libyuv::RGB24Mirror(s->data, 3 * s->step, d->data, 3 * d->step, s->width, -s->height);
+         }),
+         ""},
+        {"rotateKelImageVH, 4 bytes", 16, same, rotateKelImageVH, OPENCV(flipCv(-1)), "", LIBYUV(turned4<true>), ""},
         {"rotateKelImageHomography, 1 byte", 0, same, warpKel, warpCv, fixedPoint, {}, ""},
         {"rotateKelImageHomography, 2 bytes", 3, same, warpKel, warpCv, fixedPoint, {}, ""},
         {"rotateKelImageHomography, 3 bytes", 8, same, warpKel, warpCv, fixedPoint, {}, ""},
@@ -131,13 +166,23 @@ std::vector<Case> cases() {
         {"resizeKelImageHalf, 2 bytes", 3, halved, resizeKelImageHalf, OPENCV(resizeCv(cv::INTER_NEAREST)), "", {}, ""},
         {"resizeKelImageHalf, 3 bytes", 8, halved, resizeKelImageHalf, OPENCV(resizeCv(cv::INTER_NEAREST)), "", {}, ""},
         {"resizeKelImageHalf, 4 bytes", 16, halved, resizeKelImageHalf, OPENCV(resizeCv(cv::INTER_NEAREST)), "",
-         LIBYUV([](kelImage_t* d, const kelImage_t* s) {
-             libyuv::ARGBScale(s->data, 4 * s->step, s->width, s->height, d->data, 4 * d->step, d->width, d->height,
-                               libyuv::kFilterNone);
+         LIBYUV(scaled4<libyuv::kFilterNone>), "keeps the odd pixels"},
+        {"resizeKelImageNearest, 1 byte, 1/2", 0, halved, resizeKelImageNearest, OPENCV(resizeCv(cv::INTER_NEAREST)),
+         "keeps the even pixels", LIBYUV([](kelImage_t* d, const kelImage_t* s) {
+             libyuv::ScalePlane(s->data, s->step, s->width, s->height, d->data, d->step, d->width, d->height,
+                                libyuv::kFilterNone);
          }),
-         "keeps the odd pixels"},
-        {"resizeKelImageNearest, 1 byte, 1/2",
+         ""},
+        {"resizeKelImageNearest, 1 byte, 1/3",
          0,
+         third,
+         resizeKelImageNearest,
+         OPENCV(resizeCv(cv::INTER_NEAREST)),
+         "rounds down",
+         {},
+         ""},
+        {"resizeKelImageNearest, 3 bytes, 1/2",
+         8,
          halved,
          resizeKelImageNearest,
          OPENCV(resizeCv(cv::INTER_NEAREST)),
@@ -152,43 +197,18 @@ std::vector<Case> cases() {
          "samples between four pixels",
          {},
          ""},
-        {"resizeLinerInterpolation, x2",
-         16,
-         doubled,
-         resizeLinerInterpolation,
-         OPENCV(resizeCv(cv::INTER_LINEAR)),
-         "fourth channel, pixel centres",
-         {},
-         ""},
+        {"resizeLinerInterpolation, x2", 16, doubled, resizeLinerInterpolation, OPENCV(resizeCv(cv::INTER_LINEAR)),
+         "fourth channel, pixel centres", LIBYUV(scaled4<libyuv::kFilterBilinear>), "fourth channel, coarser weights"},
+        {"resizeLinerInterpolation, 3/2", 16, threeHalves, resizeLinerInterpolation, OPENCV(resizeCv(cv::INTER_LINEAR)),
+         "fourth channel, pixel centres", LIBYUV(scaled4<libyuv::kFilterBilinear>), "fourth channel, coarser weights"},
         {"zero_order_hold_plus_ave, 1/2", 16, halved, zero_order_hold_plus_ave, OPENCV(resizeCv(cv::INTER_AREA)),
-         "rounds once, to nearest", LIBYUV([](kelImage_t* d, const kelImage_t* s) {
-             libyuv::ARGBScale(s->data, 4 * s->step, s->width, s->height, d->data, 4 * d->step, d->width, d->height,
-                               libyuv::kFilterBox);
-         }),
-         "rounds once, to nearest"},
-        {"zero_order_hold_plus_ave, 2/3",
-         16,
-         twoThirds,
-         zero_order_hold_plus_ave,
-         OPENCV(resizeCv(cv::INTER_AREA)),
-         "rounds once, to nearest",
-         {},
-         ""},
+         "rounds once, to nearest", LIBYUV(scaled4<libyuv::kFilterBox>), "rounds once, to nearest"},
+        {"zero_order_hold_plus_ave, 2/3", 16, twoThirds, zero_order_hold_plus_ave, OPENCV(resizeCv(cv::INTER_AREA)),
+         "rounds once, to nearest", LIBYUV(scaled4<libyuv::kFilterBox>), "whole pixels in a box"},
         {"resizeKelImageEnborder 16, 1 byte", 0, bordered, borderKel, borderCv, "", {}, ""},
         {"resizeKelImageEnborder 16, 3 bytes", 8, bordered, borderKel, borderCv, "", {}, ""},
-        {"resizeKelImageDeborder 16, 1 byte",
-         0,
-         [](const ImageSize& s) {
-             return ImageSize{s.width - 32, s.height - 32, ""};
-         },
-         cropKel,
-         OPENCV([](kelImage_t* d, const kelImage_t* s) {
-             cv::Mat to = mat(d);
-             mat(s)(cv::Rect(16, 16, d->width, d->height)).copyTo(to);
-         }),
-         "",
-         {},
-         ""},
+        {"resizeKelImageDeborder 16, 1 byte", 0, cropSize, cropKel, cropCv, "", LIBYUV(cropped<1>), ""},
+        {"resizeKelImageDeborder 16, 3 bytes", 8, cropSize, cropKel, cropCv, "", LIBYUV(cropped<3>), ""},
     };
 }
 
