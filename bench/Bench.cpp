@@ -69,6 +69,14 @@ double median(std::vector<double> values) {
     return values[values.size() / 2];
 }
 
+// Whether a run failed, as Google Benchmark says it before 1.8 and since.
+template <class Run> auto hasFailed(const Run& run, int) -> decltype(run.error_occurred) {
+    return run.error_occurred;
+}
+template <class Run> bool hasFailed(const Run& run, long) {
+    return static_cast<int>(run.skipped) != 0;
+}
+
 // Keeps the time of every repetition, in microseconds, and leaves a mark of progress.
 class Collector : public benchmark::BenchmarkReporter {
 public:
@@ -76,7 +84,7 @@ public:
     bool ReportContext(const Context&) override { return true; }
     void ReportRuns(const std::vector<Run>& runs) override {
         for (const Run& run : runs)
-            if (run.run_type == Run::RT_Iteration && !run.error_occurred)
+            if (run.run_type == Run::RT_Iteration && !hasFailed(run, 0))
                 times[run.run_name.function_name].push_back(run.GetAdjustedCPUTime() / 1000);
         std::cerr << '.' << std::flush;
     }
@@ -203,12 +211,8 @@ Lines::Lines(void (*addLines)()) {
 
 namespace {
 
-ImagePointer owned(kelImage_t* image) {
-    return ImagePointer(image, [](kelImage_t* last) { releaseKelImage(&last); });
-}
-
-ImagePointer render(int width, int height, int type) {
-    ImagePointer made = owned(createKelImage(width, height, type));
+kel::Image render(int width, int height, int type) {
+    kel::Image made(width, height, type);
     uint32_t state = 1;
     const int bytes = made->channels * made->depth;
     for (int i = 0; i < made->size; ++i) {
@@ -222,11 +226,12 @@ ImagePointer render(int width, int height, int type) {
 } // namespace
 
 ImagePointer image(int width, int height, int type) {
-    static std::map<std::tuple<int, int, int>, ImagePointer> rendered; // once: a run asks for its images many times
-    ImagePointer& original = rendered[{width, height, type}];
+    static std::map<std::tuple<int, int, int>, kel::Image> rendered; // once: a run asks for its images many times
+    kel::Image& original = rendered[{width, height, type}];
     if (!original)
         original = render(width, height, type);
-    return owned(cloneKelImage(original.get()));
+    const auto copy = std::make_shared<kel::Image>(original.clone());
+    return ImagePointer(copy, copy->get());
 }
 
 } // namespace kel_bench
@@ -270,6 +275,10 @@ int main(int argc, char** argv) {
     Collector collector;
     benchmark::RunSpecifiedBenchmarks(&collector);
     std::cerr << '\n';
+    if (collector.times.empty()) {
+        std::cerr << "kel_bench: no benchmark has that name\n";
+        return 1;
+    }
     const std::vector<Row> rows = evaluate(collector.times);
     std::cout << table(rows);
     const bool saved = (tablePath.empty() || save(tablePath, "# Performance\n\n" + table(rows))) &&

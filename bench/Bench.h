@@ -4,7 +4,7 @@
 #define KEL_BENCH_H
 
 #include <functional>
-#include <kel/kelImage.h>
+#include <kel/kelImage.hpp>
 #include <memory>
 #include <string>
 #include <vector>
@@ -40,7 +40,7 @@ struct ImageSize {
 };
 extern const std::vector<ImageSize> kImageSizes; // 640x480, 1920x1080, 3840x2160
 
-// An image with smooth, noisy content, the same at every call; released with its last user.
+// An image with smooth, noisy content, the same at every call; released with its last user, for the calls are copied.
 using ImagePointer = std::shared_ptr<kelImage_t>;
 ImagePointer image(int width, int height, int type);
 

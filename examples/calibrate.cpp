@@ -99,7 +99,7 @@ void printTable(const kelMat& truth, const kelMat& estimate) {
 
 // Measured points as crosses, green for inliers and red for others; circles where the estimate takes the points in space.
 Image drawReprojection(const kelMatCorrespP& pairs, kelMat P, const std::vector<bool>& inlier) {
-    Image picture = create(kWidth, kHeight, KEL_PIXEL_TYPE_U8ZYX);
+    Image picture(kWidth, kHeight, KEL_PIXEL_TYPE_U8ZYX);
     std::fill_n(picture->data, picture->size, static_cast<unsigned char>(24));
     for (int i = 0; i < pairs.m_Num; ++i) {
         const float x = pairs.m_ImgX[i], y = pairs.m_ImgY[i];

@@ -96,8 +96,8 @@ int registerPictures(const Options& options) {
     kelMat truth;
     if (options.pictures.empty()) {
         const Scene scene = renderScene(options.seed);
-        first = clone(scene.first);
-        second = clone(scene.second);
+        first = scene.first.clone();
+        second = scene.second.clone();
         truth = scene.H;
     } else {
         first = readPicture(options.pictures[0]);

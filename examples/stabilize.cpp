@@ -54,7 +54,7 @@ void flipNeutral(const Image& plane) {
 Frame warpFrame(const Frame& frame, const VideoFormat& format, const kelMat& H) {
     const Size size = format.size, colourSize = format.colourSize();
     const kelMat onColour = onPlane(H, format.colour);
-    Frame warped{warpPicture(frame.y, H, size), nullptr, nullptr};
+    Frame warped{warpPicture(frame.y, H, size), Image(), Image()};
     for (const auto plane : {&Frame::u, &Frame::v}) {
         flipNeutral(frame.*plane);
         warped.*plane = warpPicture(frame.*plane, onColour, colourSize);
@@ -74,7 +74,7 @@ Margin marginOf(Size size, float share) {
 }
 
 Image cutPlane(const Image& plane, int left, int top, Size size) {
-    Image cut = create(size.width, size.height, KEL_PIXEL_TYPE_U8G);
+    Image cut(size.width, size.height, KEL_PIXEL_TYPE_U8G);
     loadKelImageData(cut.get(), plane->data + static_cast<ptrdiff_t>(top) * plane->step + left, size.width, size.height,
                      plane->step);
     return cut;
@@ -96,7 +96,7 @@ public:
     const kelMat& correction() const { return m_correction; }
 
     void add(const Image& luma) {
-        const Image half = create(m_size.width / 2, m_size.height / 2, KEL_PIXEL_TYPE_U8G);
+        Image half(m_size.width / 2, m_size.height / 2, KEL_PIXEL_TYPE_U8G);
         if (half->width < 2 || half->height < 2)
             return;
         clearKelImage(half.get()); // its padding counts for the contrast

@@ -35,7 +35,7 @@ void place(Image& canvas, const Image& picture, int left, int top) {
 }
 
 Image sideBySide(const Image& first, const Image& second) {
-    Image both = create(first->width + second->width, std::max(first->height, second->height), KEL_PIXEL_TYPE_U8ZYX);
+    Image both(first->width + second->width, std::max(first->height, second->height), KEL_PIXEL_TYPE_U8ZYX);
     clearKelImage(both.get());
     place(both, first, 0, 0);
     place(both, second, first->width, 0);
@@ -111,11 +111,11 @@ Image drawMosaic(const Image& first, const Image& second, const kelMat& H) {
     shift[0][2] = static_cast<float>(shiftX);
     shift[1][2] = static_cast<float>(shiftY);
 
-    Image canvas = create(size.width, size.height, KEL_PIXEL_TYPE_U8ZYX);
+    Image canvas(size.width, size.height, KEL_PIXEL_TYPE_U8ZYX);
     clearKelImage(canvas.get());
     place(canvas, second, shiftX, shiftY);
     // A white picture warped alike tells where the first one lies.
-    Image white = create(first->width, first->height, KEL_PIXEL_TYPE_U8ZYX);
+    Image white(first->width, first->height, KEL_PIXEL_TYPE_U8ZYX);
     std::memset(white->data, 255, static_cast<size_t>(white->size));
     const Image warped = warpPicture(first, shift * H, size), covered = warpPicture(white, shift * H, size);
     for (int y = 0; y < size.height; ++y)

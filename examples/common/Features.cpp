@@ -27,9 +27,9 @@ struct Level {
 // The level of `image` and the image for the next one, half as large.
 Level makeLevel(const Image& image, float scale, float offset, Image& next) {
     const int width = image->width + 2 * kBorder, height = image->height + 2 * kBorder;
-    Level level{create(width, height, KEL_PIXEL_TYPE_U8G), create(width, height, KEL_PIXEL_TYPE_S16G), scale, offset};
-    const Image scratch = create(width, height, KEL_PIXEL_TYPE_U8G);
-    const Image half = create((width + 1) / 2, (height + 1) / 2, KEL_PIXEL_TYPE_U8G);
+    Level level{Image(width, height, KEL_PIXEL_TYPE_U8G), Image(width, height, KEL_PIXEL_TYPE_S16G), scale, offset};
+    Image scratch(width, height, KEL_PIXEL_TYPE_U8G);
+    Image half((width + 1) / 2, (height + 1) / 2, KEL_PIXEL_TYPE_U8G);
     clearKelImage(scratch.get());
     clearKelImage(level.cross.get());
     clearKelImage(half.get());
@@ -37,7 +37,7 @@ Level makeLevel(const Image& image, float scale, float offset, Image& next) {
     resizeKelImageEnborder(level.smooth.get(), image.get(), kBorder);
     applyKelFilterGaussian7X7_downsampling(level.smooth.get(), half.get(), level.smooth.get(), scratch.get());
     applyKelFilterLaplacian3X3(level.cross.get(), level.smooth.get());
-    next = create(half->width - kBorder, half->height - kBorder, KEL_PIXEL_TYPE_U8G);
+    next = Image(half->width - kBorder, half->height - kBorder, KEL_PIXEL_TYPE_U8G);
     resizeKelImageDeborder(next.get(), half.get(), kBorder / 2);
     return level;
 }
@@ -53,14 +53,14 @@ void addChain(std::vector<Level>& levels, Image image, float scale, float offset
 
 // Two chains of halves: from the picture, and from its first smoothed level reduced by the square root of 2.
 std::vector<Level> makePyramid(const Image& grey) {
-    const Image stretched = create(grey->width, grey->height, KEL_PIXEL_TYPE_U8G);
+    Image stretched(grey->width, grey->height, KEL_PIXEL_TYPE_U8G);
     adjustKelImage(stretched.get(), grey.get());
     std::vector<Level> levels;
-    addChain(levels, clone(stretched), 1, 0);
+    addChain(levels, stretched.clone(), 1, 0);
     if (levels.empty())
         return levels;
     const float root = std::sqrt(2.0f);
-    Image between = create(static_cast<int>(grey->width / root), static_cast<int>(grey->height / root), KEL_PIXEL_TYPE_U8G);
+    Image between(static_cast<int>(grey->width / root), static_cast<int>(grey->height / root), KEL_PIXEL_TYPE_U8G);
     rotateKelImageHomography(between.get(), levels[0].smooth.get(), root, 0, kBorder, 0, root, kBorder, 0, 0, 1);
     // Pixel centres map to pixel centres at p * root + (root - 1) / 2; halving keeps even pixels, and so the offset.
     addChain(levels, std::move(between), root, (root - 1) / 2);
@@ -187,11 +187,11 @@ struct Candidate {
     float x, y; // in pixels of the picture
 };
 
-std::vector<Candidate> detect(const std::vector<Level>& levels) {
+std::vector<Candidate> detect(std::vector<Level>& levels) {
     std::vector<Candidate> candidates;
     std::vector<kelKeypoint2DF32_t> points;
     for (size_t i = 0; i < levels.size(); ++i) {
-        const Level& level = levels[i];
+        Level& level = levels[i];
         const int width = level.smooth->width - 2 * kBorder, height = level.smooth->height - 2 * kBorder;
         points.resize(static_cast<size_t>(level.smooth->width) * level.smooth->height / 16);
         const int count = applyKelDetectorKeypointYape(points.data(), static_cast<kelValue_s32>(points.size()),
@@ -264,7 +264,7 @@ struct Best {
 } // namespace
 
 std::vector<Feature> findFeatures(const Image& grey, int most) {
-    const std::vector<Level> levels = makePyramid(grey);
+    std::vector<Level> levels = makePyramid(grey);
     std::vector<Feature> features;
     std::vector<float> angles;
     for (const Candidate& c : strongest(detect(levels), grey->width, grey->height, most)) {

@@ -31,10 +31,11 @@ Image createPicture(size_t width, size_t height, const std::string& name) {
     if (width > kMostPixels || height > kMostPixels || width * height > kMostInAll)
         fail(name, "a picture of " + size + " pixels is too large; at most " + std::to_string(kMostPixels) +
                        " either way and " + std::to_string(kMostInAll) + " in all");
-    Image image = create(static_cast<int>(width), static_cast<int>(height), KEL_PIXEL_TYPE_U8ZYX);
-    if (!image->data)
+    try {
+        return Image(static_cast<int>(width), static_cast<int>(height), KEL_PIXEL_TYPE_U8ZYX);
+    } catch (const std::bad_alloc&) {
         fail(name, "not enough memory for a picture of " + size + " pixels");
-    return image;
+    }
 }
 
 Image decodePng(const uint8_t* bytes, size_t size, const std::string& name) {
@@ -236,7 +237,7 @@ void writePicture(const std::string& path, const Image& image) {
 }
 
 Image greyOf(const Image& picture) {
-    Image grey = create(picture->width, picture->height, KEL_PIXEL_TYPE_U8G);
+    Image grey(picture->width, picture->height, KEL_PIXEL_TYPE_U8G);
     convertKelImage(grey.get(), picture.get());
     for (int y = 0; y < grey->height; ++y) {
         uint8_t* const row = grey->data + static_cast<ptrdiff_t>(y) * grey->step;

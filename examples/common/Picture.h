@@ -3,25 +3,14 @@
 #define KEL_EXAMPLES_PICTURE_H
 
 #include <cstdint>
-#include <kel/kelImage.h>
-#include <memory>
+#include <kel/kelImage.hpp>
 #include <string>
 
 #include "Output.h"
 
 namespace kel_examples {
 
-struct Release {
-    void operator()(kelImage_t* image) const { releaseKelImage(&image); }
-};
-using Image = std::unique_ptr<kelImage_t, Release>;
-
-inline Image create(int width, int height, int type) {
-    return Image(createKelImage(width, height, type));
-}
-inline Image clone(const Image& image) {
-    return Image(cloneKelImage(image.get()));
-}
+using kel::Image;
 
 // Decodes a picture in memory to RGB (U8ZYX). `name` stands in the errors.
 Image decodePicture(const uint8_t* bytes, size_t size, const std::string& name);

@@ -128,7 +128,7 @@ Registration fitHomography(const std::vector<Feature>& first, const std::vector<
 
 Image warpPicture(const Image& picture, const kelMat& H, Size size) {
     kelMat back = H.getInversedMatrix(), shift(3, 3, true);
-    Image result = create(size.width, size.height, picture->type);
+    Image result(size.width, size.height, picture->type);
     if (back.m_Width != 3)
         return clearKelImage(result.get()), std::move(result);
     if (picture->type == KEL_PIXEL_TYPE_U8G) { // the library takes grey pictures through corners: pixel 0 has its centre at 0.5

@@ -26,7 +26,7 @@ private:
 // Ellipses and turned boxes of random colours, many small ones over few large ones.
 Image renderWall(Numbers& numbers) {
     constexpr int kShapes = 900;
-    Image wall = create(kWidth + 2 * kMargin, kHeight + 2 * kMargin, KEL_PIXEL_TYPE_U8ZYX);
+    Image wall(kWidth + 2 * kMargin, kHeight + 2 * kMargin, KEL_PIXEL_TYPE_U8ZYX);
     for (int i = 0; i < wall->size; ++i)
         wall->data[i] = static_cast<uint8_t>(150 + 40 * ((i % 3) - 1));
     for (int shape = 0; shape < kShapes; ++shape) {

@@ -238,9 +238,9 @@ bool VideoReader::read(Frame& frame) {
         fail("frame " + std::to_string(m_frames) + " is incomplete (" + std::to_string(got) + " of " +
              std::to_string(m_bytes.size()) + " bytes)");
     const Size size = m_format.size, colour = m_format.colourSize();
-    frame.y = create(size.width, size.height, KEL_PIXEL_TYPE_U8G);
-    frame.u = create(colour.width, colour.height, KEL_PIXEL_TYPE_U8G);
-    frame.v = create(colour.width, colour.height, KEL_PIXEL_TYPE_U8G);
+    frame.y = Image(size.width, size.height, KEL_PIXEL_TYPE_U8G);
+    frame.u = Image(colour.width, colour.height, KEL_PIXEL_TYPE_U8G);
+    frame.v = Image(colour.width, colour.height, KEL_PIXEL_TYPE_U8G);
     if (m_format.raw) {
         unpackRaw(frame);
     } else {

@@ -1,6 +1,6 @@
 // Both halves from C++.
 #include <cstdio>
-#include <kel/kelImage.h>
+#include <kel/kelImage.hpp>
 #include <kel/kelMat.h>
 
 int main() {
@@ -10,7 +10,6 @@ int main() {
     kelMatEstimatorH H;
     int inliers = 0;
     const bool found = H.estimate_byRANSAC_fine(pairs, 1, &inliers);
-    kelImage_t* image = createKelImage(17, 1, KEL_PIXEL_TYPE_U8G);
+    kel::Image image(17, 1, KEL_PIXEL_TYPE_U8G);
     std::printf("%d %d %.2f %.2f, step %d\n", found, inliers, H[0][0], H[0][2], image->step);
-    releaseKelImage(&image);
 }

@@ -186,10 +186,10 @@ TEST_F(Programs, RegisterBearsTurnsScalesAndTilts) {
 TEST_F(Programs, RegisterSaysWhereThereIsNoHomography) {
     writePicture(path("a.png"), renderScene(11).first);
     writePicture(path("b.png"), renderScene(12).first);
-    Image blank = create(100, 80, KEL_PIXEL_TYPE_U8ZYX);
+    Image blank(100, 80, KEL_PIXEL_TYPE_U8ZYX);
     clearKelImage(blank.get());
     writePicture(path("blank.png"), blank);
-    Image tiny = create(2, 2, KEL_PIXEL_TYPE_U8ZYX);
+    Image tiny(2, 2, KEL_PIXEL_TYPE_U8ZYX);
     clearKelImage(tiny.get());
     writePicture(path("tiny.png"), tiny);
     for (const char* second : {"b.png", "blank.png", "tiny.png"}) {

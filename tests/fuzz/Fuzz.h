@@ -8,8 +8,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <kel/kelImage.h>
-#include <memory>
+#include <kel/kelImage.hpp>
 #include <random>
 #include <vector>
 
@@ -60,18 +59,13 @@ private:
     size_t m_size;
 };
 
-struct Release {
-    void operator()(kelImage_t* image) const {
-        free(image->data);
-        releaseKelImageHeader(&image);
-    }
-};
-using Image = std::unique_ptr<kelImage_t, Release>;
+using kel::Image;
 
 // An image whose data area is a heap block of just its size (and `extra` bytes), so that the sanitizer sees every step beside it.
 inline Image image(int width, int height, int type, size_t extra = 0) {
     Image result(createKelImageHeader(width, height, type));
-    result->data = static_cast<uint8_t*>(malloc(static_cast<size_t>(result->size) + extra));
+    result->buffer = malloc(static_cast<size_t>(result->size) + extra); // owned by the record as the library's own block is
+    result->data = static_cast<uint8_t*>(result->buffer);
     return result;
 }
 

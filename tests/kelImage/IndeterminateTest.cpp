@@ -2,24 +2,20 @@
 // operation decides anything by an indeterminate byte, and what it is documented to write comes out determined.
 #include <functional>
 #include <gtest/gtest.h>
-#include <kel/kelImage.h>
-#include <memory>
+#include <kel/kelImage.hpp>
 
 #include "Random.h"
 #include "Valgrind.h"
 
 namespace {
 
-struct Release {
-    void operator()(kelImage_t* image) const { releaseKelImage(&image); }
-};
-using Image = std::unique_ptr<kelImage_t, Release>;
+using kel::Image;
 
 constexpr int kHeight = 50;
 
 // Nothing but the pixels is determined.
 Image source(int type, int width) {
-    Image image(createKelImage(width, kHeight, type));
+    Image image(width, kHeight, type);
     std::mt19937 random = kel_test::generator(90);
     const int bytes = image->channels * image->depth;
     for (int y = 0; y < kHeight; ++y)
@@ -28,7 +24,7 @@ Image source(int type, int width) {
     return image;
 }
 Image scratch(int type, int width, int height = kHeight) {
-    return Image(createKelImage(width, height, type));
+    return Image(width, height, type);
 }
 
 // Columns left .. width - right - 1 of rows top .. height - bottom - 1.
@@ -51,7 +47,7 @@ TEST(Indeterminate, BytesDecideNothingAndGoNowhere) {
     if (!RUNNING_ON_VALGRIND)
         GTEST_SKIP() << "valgrind has something to say here";
     using Call = std::function<void(kelImage_t*, const kelImage_t*)>;
-    const Image bytes = scratch(0, 61), words = scratch(3, 61);
+    Image bytes = scratch(0, 61), words = scratch(3, 61);
     const struct {
         const char* name;
         int from, to, width;
@@ -134,11 +130,11 @@ TEST(Indeterminate, BytesDecideNothingAndGoNowhere) {
          [](kelImage_t* d, const kelImage_t* s) { loadKelImageData(d, s->data, s->width, s->height, s->step); }},
     };
     for (const auto& c : cases) {
-        const Image src = source(c.from, c.width), dst = scratch(c.to, c.width);
+        Image src = source(c.from, c.width), dst = scratch(c.to, c.width);
         c.call(dst.get(), src.get());
         expectDetermined(dst, c.region, c.name);
     }
-    const Image src = source(0, 64), half = scratch(0, 32, kHeight / 2);
+    Image src = source(0, 64), half = scratch(0, 32, kHeight / 2);
     for (auto resize : {resizeKelImageNearest, resizeKelImageBilinear, resizeKelImageHalf}) {
         VALGRIND_MAKE_MEM_UNDEFINED(half->data, half->size);
         resize(half.get(), src.get());
@@ -150,7 +146,7 @@ TEST(Indeterminate, PaddingHasNoPartInKeypoints) {
     if (!RUNNING_ON_VALGRIND)
         GTEST_SKIP() << "valgrind has something to say here";
     for (int width : {60, 61, 70}) {
-        const Image grey = source(0, width), response = source(3, width);
+        Image grey = source(0, width), response = source(3, width);
         kelKeypoint2DF32_t keypoints[500];
         const int count = applyKelDetectorKeypointYape(keypoints, 500, grey.get(), response.get());
         EXPECT_GT(count, 0);
