@@ -19,14 +19,14 @@ template <class V> void storeTriples(uint8_t* d, V grey) {
 
 void greyToThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 3, 1>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         storeTriples(to, V::load(from));
     });
 }
 
 void greyToFour(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<4, 4, 1>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         static constexpr Sixteen quadruple = {{0, 0, 0, -1, 4, 4, 4, -1, 8, 8, 8, -1, 12, 12, 12, -1}};
         store(to, shuffle(V::loadBytesAsLongs(from), V::every(quadruple)));
     });
@@ -34,7 +34,7 @@ void greyToFour(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
 
 void greyToWords(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<8, 2, 1>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         store(to, V::loadBytesAsWords(from));
     });
 }
@@ -52,21 +52,21 @@ template <class V> V magnitudeBytes(const uint8_t* s) {
 
 void magnitudeToGrey(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 1, 2>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         store(to, magnitudeBytes<V>(from));
     });
 }
 
 void magnitudeToThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 3, 2>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         storeTriples(to, magnitudeBytes<V>(from));
     });
 }
 
 void magnitudeToFour(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<8, 4, 2>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         static constexpr Sixteen first = {{0, 0, 0, -1, 2, 2, 2, -1, 4, 4, 4, -1, 6, 6, 6, -1}},
                                  second = {{8, 8, 8, -1, 10, 10, 10, -1, 12, 12, 12, -1, 14, 14, 14, -1}};
         const V words = magnitudes<V>(from);
@@ -98,14 +98,14 @@ template <int S, class V> V meansOfEight(const uint8_t* s, ptrdiff_t stride) {
 
 void meanOfThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 1, 3>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         store(to, packWords(meansOfEight<3, V>(from, 48), meansOfEight<3, V>(from + 24, 48)));
     });
 }
 
 void wordMeanOfThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<8, 2, 3>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         store(to, meansOfEight<3, V>(from, 24));
     });
 }
@@ -113,7 +113,7 @@ void wordMeanOfThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
 // The same of four channels, to every third place of the destination: what lies between is not written.
 void meanOfFourSpread(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     const auto block = [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         storeThirds(to, packWords(meansOfEight<4, V>(from, 64), meansOfEight<4, V>(from + 32, 64)));
     };
     for (; pixels >= 16 * Wide::kLanes; pixels -= 16 * Wide::kLanes, d += 48 * Wide::kLanes, s += 64 * Wide::kLanes)
@@ -126,7 +126,7 @@ void meanOfFourSpread(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
 
 void wordMeanOfFourSpread(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     const auto block = [](auto of, int16_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         storeThirds(to, meansOfEight<4, V>(from, 32));
     };
     int16_t* to = reinterpret_cast<int16_t*>(d);
@@ -144,7 +144,7 @@ void wordMeanOfFourSpread(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
 // vector before.
 void threeReversed(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 3, 3>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         static constexpr Sixteen m00 = {{2, 1, 0, 5, 4, 3, 8, 7, 6, 11, 10, 9, 14, 13, 12, -1}},
                                  m01 = {{-1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, 1}},
                                  m10 = {{-1, 15, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1, -1}},
@@ -169,21 +169,21 @@ constexpr int kSparePixels = (kTwelveSpare + 2) / 3;
 
 template <const Sixteen& order> void threesToFours(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<4, 4, 3, kSparePixels>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         store(to, shuffle(loadTwelves(from, V()), V::every(order)));
     });
 }
 
 template <const Sixteen& order> void foursToThrees(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<4, 3, 4, kSparePixels>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         storeTwelves(to, shuffle(V::load(from), V::every(order)));
     });
 }
 
 void fourReversed(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<4, 4, 4>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         static constexpr Sixteen reverse = {{2, 1, 0, 3, 6, 5, 4, 7, 10, 9, 8, 11, 14, 13, 12, 15}};
         store(to, shuffle(V::load(from), V::every(reverse)));
     });

@@ -1,42 +1,24 @@
 // YAPE keypoints: local extrema of the cross response that are strong, not edge-like, and refined to a fraction of a pixel.
-// Rests on the row helpers; a vector test finds the few columns of a row that can be extrema at all.
+// Rests on the row helpers; a kernel finds the few columns of a row that can be extrema at all.
 #include <algorithm>
 #include <cmath>
 #include <cstdlib>
 
+#include "kelImage_Kernels.h"
 #include "kelImage_Private.h"
-#include "kelImage_Vector.h"
 
 namespace {
-
-using kel::load16;
 
 constexpr kelValue_s32 kBorder = 9; // pixels nearer to an edge are never examined
 constexpr int kWeak = 19;           // up to here the scan steps over the next column
 constexpr int kStrong = 31;         // from here an extremum counts
 constexpr int kLeastScore = 26;
 constexpr int kRounds = 5;          // of the refinement
-constexpr kelValue_s32 kBlock = 16; // columns that are tested at a time
+constexpr kelValue_s32 kBlock = 64; // columns of a mask
 
 struct Offset {
     float x, y;
 };
-
-// Eight columns: all bits where the response is strong and beyond its left, right, upper and lower neighbour.
-inline __m128i eightCandidates(const int16_t* r, ptrdiff_t step) {
-    const __m128i left = load16(r - 1), right = load16(r + 1), up = load16(r - step), down = load16(r + step);
-    const __m128i most = _mm_max_epi16(_mm_max_epi16(left, right), _mm_max_epi16(up, down));
-    const __m128i least = _mm_min_epi16(_mm_min_epi16(left, right), _mm_min_epi16(up, down));
-    const __m128i here = load16(r);
-    return _mm_or_si128(_mm_cmpgt_epi16(here, _mm_max_epi16(most, _mm_set1_epi16(kStrong - 1))),
-                        _mm_cmplt_epi16(here, _mm_min_epi16(least, _mm_set1_epi16(1 - kStrong))));
-}
-
-// Bit i stands for column i. Reads columns -1 .. 16 of three rows.
-inline unsigned candidates(const int16_t* r, ptrdiff_t step) {
-    const __m128i mask = _mm_packs_epi16(eightCandidates(r, step), eightCandidates(r + 8, step));
-    return static_cast<unsigned>(_mm_movemask_epi8(mask));
-}
 
 // A candidate is beyond its four direct neighbours already; an extremum is beyond the diagonal ones, too.
 bool isExtremum(const int16_t* r, ptrdiff_t step) {
@@ -74,9 +56,9 @@ Offset newtonStep(const int16_t* r, ptrdiff_t step) {
     return {(dyy * dx - dxy * dy) * k, (dxx * dy - dxy * dx) * k};
 }
 
-// Truncates; beyond 32 bits the result is the least integer, which lies outside every image.
-inline int64_t truncated(float value) {
-    return _mm_cvttss_si32(_mm_set_ss(value));
+// Truncates; beyond 32 bits, and for NaN, the result is the least integer, which lies outside every image.
+int64_t truncated(float value) {
+    return std::abs(value) < 2147483648.0f ? static_cast<int64_t>(value) : INT32_MIN;
 }
 
 bool isInside(int64_t x, int64_t y, const kelImage_t* image) {
@@ -115,26 +97,31 @@ public:
     Scan(const kelImage_t* gaussian, const kelImage_t* laplacian, kelKeypoint2DF32_t* keypoints, kelValue_s32 max)
         : m_gaussian(gaussian), m_laplacian(laplacian), m_keypoints(keypoints), m_max(max) {}
 
-    // Blocks start on a multiple of 8; those at the end of a row read on into the rows below, of which there are enough.
+    // Masks at the end of a row read on into the rows below, of which there are enough.
     void row(kelValue_s32 y) {
         const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
         const kelValue_s32 end = m_laplacian->width - kBorder;
-        for (kelValue_s32 block = kBorder - 1; block < end; block += kBlock) {
-            unsigned mask = candidates(response + block, m_laplacian->step);
-            if (block < kBorder)
-                mask &= ~1u;
-            if (end - block < kBlock) // columns behind the last may be padding, whose bytes are anyone's
-                mask &= (1u << (end - block)) - 1;
-            for (; mask != 0; mask &= mask - 1)
-                m_columns[m_pending++] = block + __builtin_ctz(mask);
-            if (m_pending > kCapacity - kBlock)
-                judge(y);
+        for (kelValue_s32 first = kBorder; first < end; first += kMasks * kBlock) {
+            uint64_t masks[kMasks];
+            const kelValue_s32 count = std::min((end - first + kBlock - 1) / kBlock, kMasks);
+            m_kernels.extremaMasks(masks, response + first, m_laplacian->step, count, kStrong);
+            for (kelValue_s32 i = 0; i < count; ++i)
+                take(y, first + i * kBlock, end, masks[i]);
         }
         judge(y);
     }
     kelValue_s32 count() const { return m_count; }
 
 private:
+    void take(kelValue_s32 y, kelValue_s32 block, kelValue_s32 end, uint64_t mask) {
+        if (end - block < kBlock) // columns behind the last may be padding, whose bytes are anyone's
+            mask &= (uint64_t(1) << (end - block)) - 1;
+        for (; mask != 0; mask &= mask - 1)
+            m_columns[m_pending++] = block + __builtin_ctzll(mask);
+        if (m_pending > kCapacity - kBlock)
+            judge(y);
+    }
+
     // Most candidates fail and none can be predicted, so the failing ones are overwritten instead of branched around.
     __attribute__((noinline)) void judge(kelValue_s32 y) {
         const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
@@ -154,6 +141,8 @@ private:
     }
 
     static constexpr int kCapacity = 128;
+    static constexpr kelValue_s32 kMasks = 8; // at a time
+    const kel::Kernels& m_kernels = kel::kernels();
     const kelImage_t* const m_gaussian;
     const kelImage_t* const m_laplacian;
     kelKeypoint2DF32_t* const m_keypoints;

@@ -4,7 +4,6 @@
 #include <string.h>
 
 #include "kelImage_Private.h"
-#include "kelImage_Type_c.h"
 
 namespace {
 

@@ -4,7 +4,11 @@
 #define KEL_IMAGE_KERNEL_TABLE_H
 
 #include "kelImage_ConvertKernels.h"
+#include "kelImage_FilterKernels.h"
 #include "kelImage_Kernels.h"
+#include "kelImage_MoveKernels.h"
+#include "kelImage_PointKernels.h"
+#include "kelImage_ResampleKernels.h"
 #include "kelImage_YuvKernels.h"
 
 const kel::Kernels kel::KEL_KERNELS_OF::kernels = {
@@ -29,6 +33,31 @@ const kel::Kernels kel::KEL_KERNELS_OF::kernels = {
     yuvToThree<true>,
     yuvToFour<false>,
     yuvToFour<true>,
+    rangeOf,
+    stretch,
+    binarize,
+    localMeansAcross,
+    binarizeByMeans,
+    fiveAcross,
+    fiveDown,
+    sevenAcross,
+    sevenDown,
+    sevenDownTwice,
+    crossRow,
+    sobelRow,
+    extremaMasks,
+    {reversed<1>, reversed<2>, reversed<3>, reversed<4>},
+    {everySecond<false, 1>, everySecond<false, 2>, everySecondThree<false>, everySecond<false, 4>},
+    {everySecond<true, 1>, everySecond<true, 2>, everySecondThree<true>, everySecond<true, 4>},
+    {warpRow<true, 1>, warpRow<false, 2>, warpRow<false, 3>, warpRow<false, 4>},
+    averageOfFour,
+    enlargeAcross,
+    mixRows,
+    reduceAcross<WordBox>,
+    reduceAcross<LongBox>,
+    reduceDown<WordBox>,
+    reduceDown<LongBox>,
+    halveBothWays,
 };
 
 #endif

@@ -13,7 +13,7 @@ struct Floats2 {
 
 struct Lanes2 {
     using Floats = Floats2;
-    static constexpr int kLanes = 2, kBytes = 32;
+    static constexpr int kLanes = 2, kBytes = 32, kThrees = 10;
     __m256i v;
 
     static Lanes2 load(const void* p) { return {_mm256_loadu_si256(static_cast<const __m256i*>(p))}; }
@@ -70,6 +70,10 @@ template <class T> void storeThirds(T* p, Lanes2 a) {
     storeThirds(p, Lanes1{_mm256_castsi256_si128(a.v)});
     storeThirds(p + 48 / sizeof(T), Lanes1{_mm256_extracti128_si256(a.v, 1)});
 }
+inline void storeThreesReversed(uint8_t* d, const uint8_t* p, Lanes2) {
+    storeThreesReversed(d, p + 15, Lanes1());
+    storeThreesReversed(d + 15, p, Lanes1());
+}
 inline Lanes2 reversedLanes(Lanes2 a) {
     return {_mm256_permute2x128_si256(a.v, a.v, 0x01)};
 }
@@ -123,9 +127,6 @@ inline Lanes2 averageBytes(Lanes2 a, Lanes2 b) {
 inline Lanes2 atLeastBytes(Lanes2 a, Lanes2 b) {
     return {_mm256_cmpeq_epi8(_mm256_max_epu8(a.v, b.v), a.v)};
 }
-inline uint64_t signsOfBytes(Lanes2 a) {
-    return static_cast<unsigned>(_mm256_movemask_epi8(a.v));
-}
 
 inline Lanes2 addWords(Lanes2 a, Lanes2 b) {
     return {_mm256_add_epi16(a.v, b.v)};
@@ -141,6 +142,10 @@ inline Lanes2 maxWords(Lanes2 a, Lanes2 b) {
 }
 inline Lanes2 greaterWords(Lanes2 a, Lanes2 b) {
     return {_mm256_cmpgt_epi16(a.v, b.v)};
+}
+inline uint64_t signsOfWords(Lanes2 a, Lanes2 b) {
+    const __m256i bytes = _mm256_permute4x64_epi64(_mm256_packs_epi16(a.v, b.v), _MM_SHUFFLE(3, 1, 2, 0));
+    return static_cast<unsigned>(_mm256_movemask_epi8(bytes));
 }
 inline Lanes2 absWords(Lanes2 a) {
     return {_mm256_abs_epi16(a.v)};
@@ -173,11 +178,22 @@ inline Lanes2 addLongs(Lanes2 a, Lanes2 b) {
 inline Lanes2 subLongs(Lanes2 a, Lanes2 b) {
     return {_mm256_sub_epi32(a.v, b.v)};
 }
+inline Lanes2 minLongs(Lanes2 a, Lanes2 b) {
+    return {_mm256_min_epi32(a.v, b.v)};
+}
 inline Lanes2 mulLongs(Lanes2 a, Lanes2 b) {
     return {_mm256_mullo_epi32(a.v, b.v)};
 }
+inline Lanes2 mulHighLongs(Lanes2 a, Lanes2 b) {
+    const __m256i even = _mm256_srli_epi64(_mm256_mul_epu32(a.v, b.v), 32);
+    const __m256i odd = _mm256_mul_epu32(_mm256_srli_epi64(a.v, 32), _mm256_srli_epi64(b.v, 32));
+    return {_mm256_blend_epi16(even, odd, 0xcc)};
+}
 inline Lanes2 greaterLongs(Lanes2 a, Lanes2 b) {
     return {_mm256_cmpgt_epi32(a.v, b.v)};
+}
+inline uint64_t signsOfLongs(Lanes2 a) {
+    return static_cast<unsigned>(_mm256_movemask_ps(_mm256_castsi256_ps(a.v)));
 }
 template <int n> Lanes2 shiftRightLongs(Lanes2 a) {
     return {_mm256_srli_epi32(a.v, n)};
@@ -189,20 +205,22 @@ inline Lanes2 packWords(Lanes2 a, Lanes2 b) {
 inline Lanes2 packLongs(Lanes2 a, Lanes2 b) {
     return {_mm256_packs_epi32(a.v, b.v)};
 }
-inline Lanes2 narrowedWords(Lanes2 a, Lanes2 b) {
-    return {_mm256_permute4x64_epi64(_mm256_packus_epi16(a.v, b.v), _MM_SHUFFLE(3, 1, 2, 0))};
-}
-inline Lanes2 narrowedLongs(Lanes2 a, Lanes2 b) {
-    return {_mm256_permute4x64_epi64(_mm256_packus_epi32(a.v, b.v), _MM_SHUFFLE(3, 1, 2, 0))};
-}
-inline __m256i inMemoryOrder(__m256 pairs) {
-    return _mm256_permute4x64_epi64(_mm256_castps_si256(pairs), _MM_SHUFFLE(3, 1, 2, 0));
-}
 inline Lanes2 evenLongs(Lanes2 a, Lanes2 b) {
-    return {inMemoryOrder(_mm256_shuffle_ps(_mm256_castsi256_ps(a.v), _mm256_castsi256_ps(b.v), _MM_SHUFFLE(2, 0, 2, 0)))};
+    return {
+        _mm256_castps_si256(_mm256_shuffle_ps(_mm256_castsi256_ps(a.v), _mm256_castsi256_ps(b.v), _MM_SHUFFLE(2, 0, 2, 0)))};
 }
 inline Lanes2 oddLongs(Lanes2 a, Lanes2 b) {
-    return {inMemoryOrder(_mm256_shuffle_ps(_mm256_castsi256_ps(a.v), _mm256_castsi256_ps(b.v), _MM_SHUFFLE(3, 1, 3, 1)))};
+    return {
+        _mm256_castps_si256(_mm256_shuffle_ps(_mm256_castsi256_ps(a.v), _mm256_castsi256_ps(b.v), _MM_SHUFFLE(3, 1, 3, 1)))};
+}
+inline Lanes2 ordered(Lanes2 ab) {
+    return {_mm256_permute4x64_epi64(ab.v, _MM_SHUFFLE(3, 1, 2, 0))};
+}
+inline Lanes2 narrowedWords(Lanes2 a, Lanes2 b) {
+    return ordered(packWords(a, b));
+}
+inline Lanes2 narrowedLongs(Lanes2 a, Lanes2 b) {
+    return ordered({_mm256_packus_epi32(a.v, b.v)});
 }
 
 inline Floats2 operator+(Floats2 a, Floats2 b) {

@@ -13,7 +13,7 @@ struct Floats4 {
 
 struct Lanes4 {
     using Floats = Floats4;
-    static constexpr int kLanes = 4, kBytes = 64;
+    static constexpr int kLanes = 4, kBytes = 64, kThrees = 21;
     __m512i v;
 
     static Lanes4 load(const void* p) { return {_mm512_loadu_si512(p)}; }
@@ -84,26 +84,34 @@ inline void storeTwelves(uint8_t* p, Lanes4 a) {
     const __m512i close = _mm512_setr_epi32(0, 1, 2, 4, 5, 6, 8, 9, 10, 12, 13, 14, 3, 7, 11, 15);
     store(p, Lanes4{_mm512_permutexvar_epi32(close, a.v)});
 }
+// Sixty-four indices, or several times as many, by a formula.
+template <int count> struct alignas(64) Indices {
+    uint8_t of[count][64];
+    __m512i operator[](int i) const { return _mm512_load_si512(of[i]); }
+};
+template <int count, class Formula> constexpr Indices<count> indices(Formula formula) {
+    Indices<count> made = {};
+    for (int i = 0; i < 64 * count; ++i)
+        made.of[i / 64][i % 64] = static_cast<uint8_t>(formula(i));
+    return made;
+}
 inline void storeThirds(uint8_t* p, Lanes4 a) {
-    alignas(64) static constexpr auto kSpread = [] {
-        struct {
-            uint8_t index[3][64];
-        } made = {};
-        for (int i = 0; i < 192; ++i)
-            made.index[i / 64][i % 64] = static_cast<uint8_t>(i / 3);
-        return made;
-    }();
+    static constexpr auto spread = indices<3>([](int i) { return i / 3; });
     constexpr uint64_t everyThird = 0x9249249249249249;
-    const auto part = [a](int i) { return _mm512_permutexvar_epi8(_mm512_load_si512(kSpread.index[i]), a.v); };
-    _mm512_mask_storeu_epi8(p, everyThird, part(0));
-    _mm512_mask_storeu_epi8(p + 64, everyThird << 2, part(1));
-    _mm512_mask_storeu_epi8(p + 128, everyThird << 1, part(2));
+    _mm512_mask_storeu_epi8(p, everyThird, _mm512_permutexvar_epi8(spread[0], a.v));
+    _mm512_mask_storeu_epi8(p + 64, everyThird << 2, _mm512_permutexvar_epi8(spread[1], a.v));
+    _mm512_mask_storeu_epi8(p + 128, everyThird << 1, _mm512_permutexvar_epi8(spread[2], a.v));
 }
 inline void storeThirds(int16_t* p, Lanes4 a) {
-    alignas(64) int16_t word[32];
-    store(word, a);
-    for (int i = 0; i < 32; ++i)
-        p[3 * i] = word[i];
+    static constexpr auto spread = indices<3>([](int i) { return 2 * (i / 6) + i % 2; });
+    constexpr uint32_t everyThird = 0x49249249;
+    _mm512_mask_storeu_epi16(p, everyThird, _mm512_permutexvar_epi8(spread[0], a.v));
+    _mm512_mask_storeu_epi16(p + 32, everyThird << 1, _mm512_permutexvar_epi8(spread[1], a.v));
+    _mm512_mask_storeu_epi16(p + 64, everyThird << 2, _mm512_permutexvar_epi8(spread[2], a.v));
+}
+inline void storeThreesReversed(uint8_t* d, const uint8_t* p, Lanes4) {
+    static constexpr auto reverse = indices<1>([](int i) { return 61 - i / 3 * 3 + i % 3; });
+    store(d, Lanes4{_mm512_permutexvar_epi8(reverse[0], Lanes4::load(p - 1).v)});
 }
 inline Lanes4 reversedLanes(Lanes4 a) {
     return {_mm512_shuffle_i64x2(a.v, a.v, _MM_SHUFFLE(0, 1, 2, 3))};
@@ -158,9 +166,6 @@ inline Lanes4 averageBytes(Lanes4 a, Lanes4 b) {
 inline Lanes4 atLeastBytes(Lanes4 a, Lanes4 b) {
     return {_mm512_movm_epi8(_mm512_cmpge_epu8_mask(a.v, b.v))};
 }
-inline uint64_t signsOfBytes(Lanes4 a) {
-    return _mm512_movepi8_mask(a.v);
-}
 
 inline Lanes4 addWords(Lanes4 a, Lanes4 b) {
     return {_mm512_add_epi16(a.v, b.v)};
@@ -176,6 +181,9 @@ inline Lanes4 maxWords(Lanes4 a, Lanes4 b) {
 }
 inline Lanes4 greaterWords(Lanes4 a, Lanes4 b) {
     return {_mm512_movm_epi16(_mm512_cmpgt_epi16_mask(a.v, b.v))};
+}
+inline uint64_t signsOfWords(Lanes4 a, Lanes4 b) {
+    return _mm512_movepi16_mask(a.v) | uint64_t(_mm512_movepi16_mask(b.v)) << 32;
 }
 inline Lanes4 absWords(Lanes4 a) {
     return {_mm512_abs_epi16(a.v)};
@@ -208,11 +216,22 @@ inline Lanes4 addLongs(Lanes4 a, Lanes4 b) {
 inline Lanes4 subLongs(Lanes4 a, Lanes4 b) {
     return {_mm512_sub_epi32(a.v, b.v)};
 }
+inline Lanes4 minLongs(Lanes4 a, Lanes4 b) {
+    return {_mm512_min_epi32(a.v, b.v)};
+}
 inline Lanes4 mulLongs(Lanes4 a, Lanes4 b) {
     return {_mm512_mullo_epi32(a.v, b.v)};
 }
+inline Lanes4 mulHighLongs(Lanes4 a, Lanes4 b) {
+    const __m512i even = _mm512_srli_epi64(_mm512_mul_epu32(a.v, b.v), 32);
+    const __m512i odd = _mm512_mul_epu32(_mm512_srli_epi64(a.v, 32), _mm512_srli_epi64(b.v, 32));
+    return {_mm512_mask_blend_epi16(0xcccccccc, even, odd)};
+}
 inline Lanes4 greaterLongs(Lanes4 a, Lanes4 b) {
     return {_mm512_maskz_set1_epi32(_mm512_cmpgt_epi32_mask(a.v, b.v), -1)};
+}
+inline uint64_t signsOfLongs(Lanes4 a) {
+    return _mm512_cmplt_epi32_mask(a.v, _mm512_setzero_si512());
 }
 template <int n> Lanes4 shiftRightLongs(Lanes4 a) {
     return {_mm512_srli_epi32(a.v, n)};
@@ -224,22 +243,22 @@ inline Lanes4 packWords(Lanes4 a, Lanes4 b) {
 inline Lanes4 packLongs(Lanes4 a, Lanes4 b) {
     return {_mm512_packs_epi32(a.v, b.v)};
 }
-inline __m512i inMemoryOrder(__m512i packed) {
-    return _mm512_permutexvar_epi64(_mm512_setr_epi64(0, 2, 4, 6, 1, 3, 5, 7), packed);
-}
-inline Lanes4 narrowedWords(Lanes4 a, Lanes4 b) {
-    return {inMemoryOrder(_mm512_packus_epi16(a.v, b.v))};
-}
-inline Lanes4 narrowedLongs(Lanes4 a, Lanes4 b) {
-    return {inMemoryOrder(_mm512_packus_epi32(a.v, b.v))};
-}
 inline Lanes4 evenLongs(Lanes4 a, Lanes4 b) {
-    const __m512i even = _mm512_setr_epi32(0, 2, 4, 6, 8, 10, 12, 14, 16, 18, 20, 22, 24, 26, 28, 30);
-    return {_mm512_permutex2var_epi32(a.v, even, b.v)};
+    return {
+        _mm512_castps_si512(_mm512_shuffle_ps(_mm512_castsi512_ps(a.v), _mm512_castsi512_ps(b.v), _MM_SHUFFLE(2, 0, 2, 0)))};
 }
 inline Lanes4 oddLongs(Lanes4 a, Lanes4 b) {
-    const __m512i odd = _mm512_setr_epi32(1, 3, 5, 7, 9, 11, 13, 15, 17, 19, 21, 23, 25, 27, 29, 31);
-    return {_mm512_permutex2var_epi32(a.v, odd, b.v)};
+    return {
+        _mm512_castps_si512(_mm512_shuffle_ps(_mm512_castsi512_ps(a.v), _mm512_castsi512_ps(b.v), _MM_SHUFFLE(3, 1, 3, 1)))};
+}
+inline Lanes4 ordered(Lanes4 ab) {
+    return {_mm512_permutexvar_epi64(_mm512_setr_epi64(0, 2, 4, 6, 1, 3, 5, 7), ab.v)};
+}
+inline Lanes4 narrowedWords(Lanes4 a, Lanes4 b) {
+    return ordered(packWords(a, b));
+}
+inline Lanes4 narrowedLongs(Lanes4 a, Lanes4 b) {
+    return ordered({_mm512_packus_epi32(a.v, b.v)});
 }
 
 inline Floats4 operator+(Floats4 a, Floats4 b) {

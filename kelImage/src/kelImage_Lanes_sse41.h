@@ -1,6 +1,6 @@
 // The vocabulary of kernels for SSE4.1: one lane of 128 bits, and what kernels do with lanes. Kernels know these names alone.
 // Wider vocabularies hold several such lanes and offer the same names. Everything works within a lane, save loads, stores and
-// narrowed(), which keep the order of memory. Whatever includes this compiles it for its own instruction set: hence the unnamed
+// what is said to keep the order of memory. Whatever includes this compiles it for its own instruction set: hence the unnamed
 // namespace, and no header that defines functions elsewhere.
 #ifndef KEL_IMAGE_LANES_SSE41_H
 #define KEL_IMAGE_LANES_SSE41_H
@@ -23,10 +23,11 @@ struct Floats1 {
 // 16 bytes, 8 words of 16 bits, or 4 longs of 32 bits, whichever an operation takes them for.
 struct Lanes1 {
     using Floats = Floats1;
-    static constexpr int kLanes = 1, kBytes = 16;
+    static constexpr int kLanes = 1, kBytes = 16, kThrees = 5;
     __m128i v;
 
     static Lanes1 load(const void* p) { return {_mm_loadu_si128(static_cast<const __m128i*>(p))}; }
+    static Lanes1 loadHalf(const void* p) { return {_mm_loadl_epi64(static_cast<const __m128i*>(p))}; } // then zeros
     // Lane k from p + k * stride.
     static Lanes1 loadLanes(const uint8_t* p, ptrdiff_t) { return load(p); }
     // Half as many bytes as words, a quarter as many as longs.
@@ -101,6 +102,11 @@ inline void storeThirds(int16_t* p, Lanes1 a) {
         p[3 * i + 12] = static_cast<int16_t>(high);
     }
 }
+// kThrees pixels of three bytes in the opposite order, from p on; one byte before and one behind them are touched, too.
+inline void storeThreesReversed(uint8_t* d, const uint8_t* p, Lanes1) {
+    const __m128i reverse = _mm_setr_epi8(13, 14, 15, 10, 11, 12, 7, 8, 9, 4, 5, 6, 1, 2, 3, 0);
+    store(d, Lanes1{_mm_shuffle_epi8(Lanes1::load(p - 1).v, reverse)});
+}
 // The lanes in the opposite order.
 inline Lanes1 reversedLanes(Lanes1 a) {
     return a;
@@ -158,9 +164,6 @@ inline Lanes1 averageBytes(Lanes1 a, Lanes1 b) { // (a + b + 1) / 2
 inline Lanes1 atLeastBytes(Lanes1 a, Lanes1 b) { // 255 where a >= b, else 0
     return {_mm_cmpeq_epi8(_mm_max_epu8(a.v, b.v), a.v)};
 }
-inline uint64_t signsOfBytes(Lanes1 a) { // the uppermost bits; bit i stands for byte i
-    return static_cast<unsigned>(_mm_movemask_epi8(a.v));
-}
 
 inline Lanes1 addWords(Lanes1 a, Lanes1 b) {
     return {_mm_add_epi16(a.v, b.v)};
@@ -176,6 +179,10 @@ inline Lanes1 maxWords(Lanes1 a, Lanes1 b) {
 }
 inline Lanes1 greaterWords(Lanes1 a, Lanes1 b) { // all ones where a > b, signed, else 0
     return {_mm_cmpgt_epi16(a.v, b.v)};
+}
+// The uppermost bits of the words of a, then of b, in the order of memory.
+inline uint64_t signsOfWords(Lanes1 a, Lanes1 b) {
+    return static_cast<unsigned>(_mm_movemask_epi8(_mm_packs_epi16(a.v, b.v)));
 }
 inline Lanes1 absWords(Lanes1 a) {
     return {_mm_abs_epi16(a.v)};
@@ -210,11 +217,22 @@ inline Lanes1 addLongs(Lanes1 a, Lanes1 b) {
 inline Lanes1 subLongs(Lanes1 a, Lanes1 b) {
     return {_mm_sub_epi32(a.v, b.v)};
 }
+inline Lanes1 minLongs(Lanes1 a, Lanes1 b) { // signed
+    return {_mm_min_epi32(a.v, b.v)};
+}
 inline Lanes1 mulLongs(Lanes1 a, Lanes1 b) {
     return {_mm_mullo_epi32(a.v, b.v)};
 }
+inline Lanes1 mulHighLongs(Lanes1 a, Lanes1 b) { // the upper 32 bits, unsigned
+    const __m128i even = _mm_srli_epi64(_mm_mul_epu32(a.v, b.v), 32);
+    const __m128i odd = _mm_mul_epu32(_mm_srli_epi64(a.v, 32), _mm_srli_epi64(b.v, 32));
+    return {_mm_blend_epi16(even, odd, 0xcc)};
+}
 inline Lanes1 greaterLongs(Lanes1 a, Lanes1 b) {
     return {_mm_cmpgt_epi32(a.v, b.v)};
+}
+inline uint64_t signsOfLongs(Lanes1 a) {
+    return static_cast<unsigned>(_mm_movemask_ps(_mm_castsi128_ps(a.v)));
 }
 template <int n> Lanes1 shiftRightLongs(Lanes1 a) { // zeros come in
     return {_mm_srli_epi32(a.v, n)};
@@ -227,19 +245,24 @@ inline Lanes1 packWords(Lanes1 a, Lanes1 b) {
 inline Lanes1 packLongs(Lanes1 a, Lanes1 b) {
     return {_mm_packs_epi32(a.v, b.v)};
 }
-// The same in the order of memory: all of a, then all of b. Words and longs must not be negative.
-inline Lanes1 narrowedWords(Lanes1 a, Lanes1 b) {
-    return packWords(a, b);
-}
-inline Lanes1 narrowedLongs(Lanes1 a, Lanes1 b) {
-    return {_mm_packus_epi32(a.v, b.v)};
-}
-// Every second long of a and b in the order of memory, from the first or from the second.
+// Every second long of a lane of a, then of b, from the first or from the second.
 inline Lanes1 evenLongs(Lanes1 a, Lanes1 b) {
     return {_mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(a.v), _mm_castsi128_ps(b.v), _MM_SHUFFLE(2, 0, 2, 0)))};
 }
 inline Lanes1 oddLongs(Lanes1 a, Lanes1 b) {
     return {_mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(a.v), _mm_castsi128_ps(b.v), _MM_SHUFFLE(3, 1, 3, 1)))};
+}
+// What has a half of each lane from a and the other from b, as packs and every second long have, in the order of memory: all of a,
+// then all of b.
+inline Lanes1 ordered(Lanes1 ab) {
+    return ab;
+}
+// Words and longs that are not negative, narrowed in the order of memory.
+inline Lanes1 narrowedWords(Lanes1 a, Lanes1 b) {
+    return ordered(packWords(a, b));
+}
+inline Lanes1 narrowedLongs(Lanes1 a, Lanes1 b) {
+    return {_mm_packus_epi32(a.v, b.v)};
 }
 
 inline Floats1 operator+(Floats1 a, Floats1 b) {

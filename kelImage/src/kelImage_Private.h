@@ -51,6 +51,21 @@ template <class T> inline const T* rowByWidth(const kelImage_t* image, kelValue_
     return reinterpret_cast<const T*>(image->data) + static_cast<ptrdiff_t>(y) * image->width;
 }
 
+// Pixels of a row with its padding.
+inline ptrdiff_t paddedWidth(const kelImage_t* image) {
+    return (static_cast<ptrdiff_t>(image->width) + 15) / 16 * 16;
+}
+
+// A filter does blocks of `block` columns from column `margin`: a block at x is done while x < width - margin. Returns the first
+// column after the last block, `margin` where there is none; it is never beyond the row's step.
+constexpr kelValue_s32 blocksEnd(kelValue_s32 width, kelValue_s32 margin, kelValue_s32 block) {
+    return width > 2 * margin ? margin + (width - 2 * margin + block - 1) / block * block : margin;
+}
+
+// Channels and element bytes of a pixel-type code; 0 for what is none.
+kelValue_s32 channelsOfType(kelValue_s32 type);
+kelValue_s32 depthOfType(kelValue_s32 type);
+
 } // namespace kel
 
 #endif

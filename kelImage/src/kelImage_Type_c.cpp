@@ -1,7 +1,7 @@
 // Channels and element bytes of a pixel-type code, 8 x layout + kind.
-#include "kelImage_Type_c.h"
-
 #include <stdint.h>
+
+#include "kelImage_Private.h"
 
 namespace kel {
 

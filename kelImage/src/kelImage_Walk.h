@@ -7,9 +7,9 @@
 
 namespace {
 
-// Tells a body which lanes to use: body(Of<V>(), ...).
+// Tells a body which lanes to use, by body(Of<V>(), ...); there, LanesOf<decltype(of)> is V.
 template <class V> struct Of { using Lanes = V; };
-#define KEL_LANES_OF(of) typename decltype(of)::Lanes
+template <class T> using LanesOf = typename T::Lanes;
 
 // Calls body(of, d, s) for blocks of N units a lane, of D bytes in the destination and S in the source. Blocks may read or write
 // up to `spare` units behind their own, as there are always some that follow; the rest of the run goes through a buffer, so that

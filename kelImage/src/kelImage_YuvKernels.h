@@ -93,7 +93,7 @@ template <class V> void storeByThrees(uint8_t* d, V c0, V c1, V c2) {
 
 template <bool blueFirst> void yuvToThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<8, 6, 4>(d, s, pixels / 2, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         const auto low = coloursOf<YuvTruncated, blueFirst>(V::loadLanes(from, 32)),
                    high = coloursOf<YuvTruncated, blueFirst>(V::loadLanes(from + 16, 32));
         storeByThrees(to, packWords(low.c0, high.c0), packWords(low.c1, high.c1), packWords(low.c2, high.c2));
@@ -102,7 +102,7 @@ template <bool blueFirst> void yuvToThree(uint8_t* d, const uint8_t* s, ptrdiff_
 
 template <bool blueFirst> void yuvToFour(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<4, 8, 4>(d, s, pixels / 2, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         static constexpr Sixteen inOrder = {{0, 8, 4, 12, 1, 9, 5, 13, 2, 10, 6, 14, 3, 11, 7, 15}};
         const auto colours = coloursOf<YuvRounded, blueFirst>(V::load(from));
         const V c01 = shuffle(packWords(colours.c0, colours.c1), V::every(inOrder)),
@@ -113,7 +113,7 @@ template <bool blueFirst> void yuvToFour(uint8_t* d, const uint8_t* s, ptrdiff_t
 
 void yuvToGrey(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 1, 2>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
-        using V = KEL_LANES_OF(of);
+        using V = LanesOf<decltype(of)>;
         store(to, narrowedWords(shiftRightWords<8>(V::load(from)), shiftRightWords<8>(V::load(from + V::kBytes))));
     });
 }

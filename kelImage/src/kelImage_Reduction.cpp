@@ -1,0 +1,176 @@
+// Reduction of four-byte pixels: every input is repeated `repeat` times, every `box` of those are averaged, rounding down; rows
+// first, then columns of such rows. Rests on kernels for the usual boxes and on plain sums for those beyond.
+#include <algorithm>
+
+#include "kelImage_Kernels.h"
+#include "kelImage_Private.h"
+#include "kelImage_Resize.h"
+
+namespace {
+
+using kel::allocate;
+using kel::Buffer;
+using kel::Kernels;
+using kel::rowByWidth;
+
+// Weights of boxes up to here are bytes, up to there words; the kernels say why.
+constexpr int64_t kByteBox = 16, kWordBox = 4103;
+
+// The inputs under one output: the first counts `head` times, the last `tail` times, those between `repeat` times. Where one
+// input alone is under the box, head is the whole box and tail 0.
+struct Box {
+    kelValue_s32 first, last;
+    int64_t head, tail;
+};
+
+struct Ratio {
+    int64_t repeat, box;
+
+    // A box of one is taken as two of the same input twice: its reciprocal would be too large for the kernels.
+    Ratio(kelValue_s32 outputs, kelValue_s32 inputs) : repeat(outputs), box(inputs) {
+        const kelValue_s32 divisor = kel::gcd(outputs, inputs);
+        const int twice = inputs == divisor ? 2 : 1;
+        repeat = repeat / divisor * twice;
+        box = box / divisor * twice;
+    }
+    bool isHalf() const { return repeat == 1 && box == 2; }
+    Box at(kelValue_s32 output) const {
+        const int64_t begin = output * box, end = begin + box;
+        const int64_t first = begin / repeat, last = (end - 1) / repeat;
+        const int64_t head = std::min((first + 1) * repeat, end) - begin;
+        return {static_cast<kelValue_s32>(first), static_cast<kelValue_s32>(last), head,
+                first == last ? 0 : end - last * repeat};
+    }
+    int64_t weight(const Box& at, kelValue_s32 input) const { // 0 for inputs behind the last
+        return input == at.first ? at.head : input < at.last ? repeat : input == at.last ? at.tail : 0;
+    }
+    // Pairs of inputs under any of the first `outputs` boxes.
+    kelValue_s32 pairs(kelValue_s32 outputs) const {
+        kelValue_s32 most = 0;
+        for (kelValue_s32 i = 0; i < outputs; ++i)
+            most = std::max(most, at(i).last - at(i).first + 1);
+        return (most + 1) / 2;
+    }
+};
+
+// Rows of inputs to rows of outputs.
+class Across {
+public:
+    Across(const Kernels& kernels, kelValue_s32 outputs, kelValue_s32 inputs)
+        : m_ratio(outputs, inputs), m_outputs(outputs), m_pitch(kel::wholeFours(outputs)), m_pairs(m_ratio.pairs(outputs)),
+          m_reduce(inputs < 2 || m_ratio.box > kWordBox ? nullptr
+                   : m_ratio.box > kByteBox             ? kernels.reduceAcrossByWords
+                                                        : kernels.reduceAcrossByBytes) {
+        if (m_reduce)
+            fillTables(inputs);
+    }
+    bool isHalf() const { return m_ratio.isHalf(); }
+    void operator()(uint32_t* to, const uint32_t* from) const {
+        if (m_reduce)
+            return m_reduce(to, from, m_index.get(), m_weights.get(), m_pairs, m_pitch, static_cast<uint32_t>(m_ratio.box));
+        for (kelValue_s32 i = 0; i < m_outputs; ++i)
+            to[i] = plainAverage(from, m_ratio.at(i));
+    }
+
+private:
+    // Every pair of inputs of every output: where it starts, and its weights side by side, four times. The last input comes as the
+    // second of its pair, so that nothing behind it is read.
+    void fillTables(kelValue_s32 inputs) {
+        const bool words = m_ratio.box > kByteBox;
+        const ptrdiff_t count = m_pairs * m_pitch, each = words ? 8 : 4;
+        m_index = allocate<int32_t>(count);
+        m_weights = allocate<uint16_t>(each * count);
+        for (ptrdiff_t i = 0; i < count; ++i) {
+            const Box box = m_ratio.at(static_cast<kelValue_s32>(std::min<ptrdiff_t>(i % m_pitch, m_outputs - 1)));
+            const int64_t wanted = box.first + 2 * (i / m_pitch), index = std::min<int64_t>(wanted, inputs - 2);
+            const auto weight = [&](int64_t k) {
+                return static_cast<uint16_t>(k < wanted ? 0 : m_ratio.weight(box, static_cast<kelValue_s32>(k)));
+            };
+            const uint16_t first = weight(index), second = weight(index + 1);
+            m_index[i] = static_cast<int32_t>(index);
+            for (ptrdiff_t k = 0; k < each; ++k)
+                m_weights[each * i + k] = static_cast<uint16_t>(!words ? first | second << 8 : k % 2 ? second : first);
+        }
+    }
+    uint32_t plainAverage(const uint32_t* from, const Box& box) const {
+        uint32_t result = 0;
+        for (int shift = 0; shift < 32; shift += 8) {
+            int64_t sum = 0;
+            for (kelValue_s32 k = box.first; k <= box.last; ++k)
+                sum += m_ratio.weight(box, k) * (from[k] >> shift & 0xff);
+            result |= static_cast<uint32_t>(sum / m_ratio.box) << shift;
+        }
+        return result;
+    }
+
+    Ratio m_ratio;
+    kelValue_s32 m_outputs;
+    ptrdiff_t m_pitch;
+    kelValue_s32 m_pairs;
+    kel::ReduceAcross m_reduce;
+    Buffer<int32_t> m_index;
+    Buffer<uint16_t> m_weights;
+};
+
+// Rows to one row, byte by byte.
+class Down {
+public:
+    Down(const Kernels& kernels, kelValue_s32 outputs, kelValue_s32 inputs)
+        : m_ratio(outputs, inputs), m_rows(2 * m_ratio.pairs(outputs)), m_row(allocate<const uint8_t*>(m_rows)),
+          m_weights(allocate<uint16_t>(m_rows)), m_reduce(m_ratio.box > kWordBox   ? nullptr
+                                                          : m_ratio.box > kByteBox ? kernels.reduceDownByWords
+                                                                                   : kernels.reduceDownByBytes) {}
+    bool isHalf() const { return m_ratio.isHalf(); }
+    kelValue_s32 rows() const { return m_rows; } // under a box at most
+    kelValue_s32 lastOf(kelValue_s32 output) const { return m_ratio.at(output).last; }
+
+    template <class RowAt> void operator()(uint8_t* to, kelValue_s32 output, ptrdiff_t bytes, RowAt rowAt) {
+        const Box box = m_ratio.at(output);
+        for (kelValue_s32 k = 0; k < m_rows; ++k) { // behind the last, that one again without any weight
+            m_row[k] = reinterpret_cast<const uint8_t*>(rowAt(std::min(box.first + k, box.last)));
+            m_weights[k] = static_cast<uint16_t>(m_ratio.weight(box, box.first + k));
+        }
+        if (m_reduce)
+            return m_reduce(to, m_row.get(), m_weights.get(), m_rows / 2, bytes, static_cast<uint32_t>(m_ratio.box));
+        for (ptrdiff_t i = 0; i < bytes; ++i) {
+            int64_t sum = 0;
+            for (kelValue_s32 k = box.first; k <= box.last; ++k)
+                sum += m_ratio.weight(box, k) * m_row[k - box.first][i];
+            to[i] = static_cast<uint8_t>(sum / m_ratio.box);
+        }
+    }
+
+private:
+    Ratio m_ratio;
+    kelValue_s32 m_rows;
+    Buffer<const uint8_t*> m_row;
+    Buffer<uint16_t> m_weights;
+    kel::ReduceDown m_reduce;
+};
+
+// Two to one both ways, the ratio of pyramids, without rows in between.
+void halveBothWays(const Kernels& kernels, kelImage_t* dst, const kelImage_t* src) {
+    for (kelValue_s32 y = 0; y < dst->height; ++y)
+        kernels.halveBothWays(rowByWidth<uint32_t>(dst, y), rowByWidth<uint32_t>(src, 2 * y),
+                              rowByWidth<uint32_t>(src, 2 * y + 1), dst->width);
+}
+
+} // namespace
+
+void kel::reduce(kelImage_t* dst, const kelImage_t* src) {
+    const Kernels& kernels = kel::kernels();
+    const Across across(kernels, dst->width, src->width);
+    Down down(kernels, dst->height, src->height);
+    if (across.isHalf() && down.isHalf())
+        return ::halveBothWays(kernels, dst, src);
+    // A ring of reduced rows, large enough for those under one box.
+    const ptrdiff_t pitch = wholeFours(dst->width);
+    Buffer<uint32_t> ring = allocate<uint32_t>(down.rows() * pitch);
+    const auto rowAt = [&](kelValue_s32 k) { return ring.get() + k % down.rows() * pitch; };
+    kelValue_s32 reduced = 0; // source rows that have passed through the ring
+    for (kelValue_s32 y = 0; y < dst->height; ++y) {
+        for (; reduced <= down.lastOf(y); ++reduced)
+            across(rowAt(reduced), rowByWidth<uint32_t>(src, reduced));
+        down(rowByWidth<uint8_t>(dst, 4 * y), y, 4 * static_cast<ptrdiff_t>(dst->width), rowAt);
+    }
+}
