@@ -14,10 +14,25 @@
 
 #include <stdint.h>
 
+#define KEL_VERSION_MAJOR 1 /**< Changes where programs have to be built anew. */
+#define KEL_VERSION_MINOR 0 /**< Grows with what is added. */
+#define KEL_VERSION_PATCH 0 /**< Grows with what is mended. */
+#define KEL_VERSION "1.0.0" /**< The three as text. */
+
 #if defined(__GNUC__)
 #define KEL_API __attribute__((visibility("default")))
 #else
 #define KEL_API
+#endif
+
+#if !defined(KEL_NO_INERT_WARNINGS) && defined(__has_attribute)
+#if __has_attribute(warning)
+#define KEL_INERT __attribute__((warning("does nothing")))
+#endif
+#endif
+#ifndef KEL_INERT
+/** Marks functions that do nothing: a call of one warns, unless KEL_NO_INERT_WARNINGS is defined before this header. */
+#define KEL_INERT
 #endif
 
 #ifdef __cplusplus
@@ -163,10 +178,10 @@ KEL_API void loadKelImageData(kelImage_t* image, const void* src, kelValue_s32 w
 KEL_API void storeKelImageData(void* dst, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch, const kelImage_t* image);
 
 /** Inert: returns null. The library reads no files. */
-KEL_API kelImage_t* loadKelImage(const char* path);
+KEL_API KEL_INERT kelImage_t* loadKelImage(const char* path);
 
 /** Inert: does nothing. The library writes no files. */
-KEL_API void storeKelImage(const char* path, const kelImage_t* image);
+KEL_API KEL_INERT void storeKelImage(const char* path, const kelImage_t* image);
 
 /* ------------------------------------------------------------------------------------------------------------------
  * Rectangles, colour tables and random numbers
@@ -174,23 +189,25 @@ KEL_API void storeKelImage(const char* path, const kelImage_t* image);
 
 /**
  * @name Rectangles
+ * @{
+ */
+/**
  * Four values in one of three forms: pp1 (x1, y1, x2, y2) two corners; ps1 (x, y, w, h) corner and size; ps2
  * (cx, cy, w, h) centre and size. The size is the plain difference of the corners. Integer halves truncate toward zero:
- * pp1 to ps2 halves the sum of the corners, ps1 to ps2 halves the size. The four conversions out of ps2 do nothing.
- * @{
+ * pp1 to ps2 halves the sum of the corners, ps1 to ps2 halves the size. The four conversions out of ps2 are inert: they do nothing.
  */
 KEL_API void kel_rectangle_translate_pp1_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src);
 KEL_API void kel_rectangle_translate_pp1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src);
 KEL_API void kel_rectangle_translate_ps1_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src);
 KEL_API void kel_rectangle_translate_ps1_to_ps2_s32(kelValue_s32* dst, const kelValue_s32* src);
-KEL_API void kel_rectangle_translate_ps2_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src);
-KEL_API void kel_rectangle_translate_ps2_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API KEL_INERT void kel_rectangle_translate_ps2_to_pp1_s32(kelValue_s32* dst, const kelValue_s32* src);
+KEL_API KEL_INERT void kel_rectangle_translate_ps2_to_ps1_s32(kelValue_s32* dst, const kelValue_s32* src);
 KEL_API void kel_rectangle_translate_pp1_to_ps1_f32(float* dst, const float* src);
 KEL_API void kel_rectangle_translate_pp1_to_ps2_f32(float* dst, const float* src);
 KEL_API void kel_rectangle_translate_ps1_to_pp1_f32(float* dst, const float* src);
 KEL_API void kel_rectangle_translate_ps1_to_ps2_f32(float* dst, const float* src);
-KEL_API void kel_rectangle_translate_ps2_to_pp1_f32(float* dst, const float* src);
-KEL_API void kel_rectangle_translate_ps2_to_ps1_f32(float* dst, const float* src);
+KEL_API KEL_INERT void kel_rectangle_translate_ps2_to_pp1_f32(float* dst, const float* src);
+KEL_API KEL_INERT void kel_rectangle_translate_ps2_to_ps1_f32(float* dst, const float* src);
 /** @} */
 
 /**
@@ -205,12 +222,12 @@ KEL_API extern const unsigned char KEL_COLOR_TABLE_SAFE[216][3];
  */
 KEL_API extern const unsigned char KEL_COLOR_TABLE_PSEUDO[64][3];
 
-/** rand() % x, in 0 .. x-1. Stops the process on "0<x". Shares the generator of rand(). */
+/** rand() % x, from 0 to x - 1. Stops the process on "0<x". Shares the generator of rand(). */
 KEL_API int KEL_RAND(int x);
 
 /**
  * The sum of twelve draws of rand() % (x + 1) minus 6x: approximately normal, mean 0, standard deviation close to x, within
- * -6x .. 6x. Always draws twelve times; x is not checked (-1 divides by zero).
+ * -6x to 6x. Always draws twelve times; x is not checked (-1 divides by zero).
  */
 KEL_API int KEL_RAND_NORMAL(int x);
 
@@ -250,6 +267,9 @@ KEL_API void convertKelImage(kelImage_t* dst, const kelImage_t* src);
 
 /**
  * @name Portable converters
+ * @{
+ */
+/**
  * For each pixel (x, y) of the destination's width and height, rows by either image's own step; s0 .. s3 and d0 .. d3 are the
  * channels in memory order, s a grey source. Nothing is checked: neither types nor sizes. Padding is neither read nor written,
  * YUV and grey sources excepted (below). Where source and destination pixels have equally many bytes both may be the same
@@ -269,7 +289,6 @@ KEL_API void convertKelImage(kelImage_t* dst, const kelImage_t* src);
  *    Pixels come in pairs U, Y0, V, Y1. At odd widths the last pair still writes both pixels, the second into the padding, and
  *    THE LAST PIXEL'S V IS READ FROM THE PADDING of the source: fill it, or red and green of that column are anyone's guess.
  *  - The other six forward to the vector converter of the same name, and write the padding as it does.
- * @{
  */
 KEL_API void convertKelImage_S16G_to_U8G(kelImage_t* dst, const kelImage_t* src);
 KEL_API void convertKelImage_S16G_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
@@ -295,6 +314,9 @@ KEL_API void convertKelImage_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src)
 
 /**
  * @name Vector converters
+ * @{
+ */
+/**
  * One continuous run through both data areas, of height times the destination's width rounded up to whole blocks; `step` is not
  * read and nothing is checked. Data need no alignment.
  *
@@ -313,7 +335,6 @@ KEL_API void convertKelImage_U8G_to_S16G(kelImage_t* dst, const kelImage_t* src)
  * from and put to pixel y * (width rounded up to 4) of the data areas.
  *
  * U8YUV_to_U8BGR and U8YUV_to_U8RGB do nothing; the portable ones of these names do the work.
- * @{
  */
 KEL_API void convertKelImageSSE_U8G_to_U8XYZ(kelImage_t* dst, const kelImage_t* src);
 KEL_API void convertKelImageSSE_U8G_to_U8XYZA(kelImage_t* dst, const kelImage_t* src);
@@ -349,7 +370,10 @@ extern "C" {
 
 /**
  * @name Contrast stretching
- * Spreads the values of a U8G image linearly over 0 .. 255. With the least and the greatest value of the source:
+ * @{
+ */
+/**
+ * Spreads the values of a U8G image linearly over 0 to 255. With the least and the greatest value of the source:
  * d = (s - least) * (255 / (greatest - least)), in single precision, rounded by the thread's rounding mode (to nearest, ties to
  * even, unless it was changed). Where all values are equal d = 0.
  *
@@ -358,9 +382,10 @@ extern "C" {
  *
  * adjustKelImage() checks and leaves images of other types than U8G alone; it calls adjustKelImage_U8G(), which calls
  * adjustKelImageSSE_U8G(), and these two check nothing. `dst` and `src` may be the same image.
- * @{
+ *
+ * adjustKelImage() stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height ==
+ * src->height".
  */
-/** Stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height == src->height". */
 KEL_API void adjustKelImage(kelImage_t* dst, const kelImage_t* src);
 KEL_API void adjustKelImage_U8G(kelImage_t* dst, const kelImage_t* src);
 KEL_API void adjustKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src);
@@ -368,14 +393,18 @@ KEL_API void adjustKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src);
 
 /**
  * @name Fixed threshold
+ * @{
+ */
+/**
  * d = 255 where s >= t, else 0, on U8G images; t is the low 8 bits of `threshold`, so 256 acts as 0 and -1 as 255. Whole rows
  * of `step` pixels are written, padding included.
  *
  * binalizeKelImage() checks and leaves images of other types alone; the two it calls check nothing. `dst` and `src` may be the
  * same image.
- * @{
+ *
+ * binalizeKelImage() stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height ==
+ * src->height".
  */
-/** Stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height == src->height". */
 KEL_API void binalizeKelImage(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
 KEL_API void binalizeKelImage_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
 KEL_API void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelValue_s32 threshold);
@@ -383,6 +412,9 @@ KEL_API void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kel
 
 /**
  * @name Adaptive threshold
+ * @{
+ */
+/**
  * d = 255 where s >= m, else 0, on U8G images; m is the mean about the pixel by the kernel (2, 7, 14, 18, 14, 7, 2) / 64 at
  * offsets -12, -8, -4, 0, 4, 8, 12, first along rows from `src` into `tmp`, then down the columns of `tmp`, truncated each time
  * (sum >> 6). A pixel equal to its mean becomes 255.
@@ -398,9 +430,10 @@ KEL_API void binalizeKelImageSSE_U8G(kelImage_t* dst, const kelImage_t* src, kel
  *
  * binalizeKelImageAdaptive() checks and leaves images of other types alone; the two it calls check nothing. `dst` and `src` may
  * be the same image.
- * @{
+ *
+ * binalizeKelImageAdaptive() stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height
+ * == src->height".
  */
-/** Stops the process on "dst->type == src->type", then on "dst->width == src->width && dst->height == src->height". */
 KEL_API void binalizeKelImageAdaptive(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
 KEL_API void binalizeKelImageAdaptive_U8G(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
 KEL_API void binalizeKelImageAdaptiveSSE_U8G(kelImage_t* dst, const kelImage_t* src, kelImage_t* tmp);
@@ -412,6 +445,9 @@ KEL_API void binalizeKelImageAdaptiveSSE_U8G(kelImage_t* dst, const kelImage_t* 
 
 /**
  * @name Gaussian 5x5
+ * @{
+ */
+/**
  * Binomial smoothing of a U8G image with w = (1, 4, 6, 4, 1) in both directions, rounded once:
  *
  *     tmp(x, y) = sum w[i] * src(x + i - 2, y)                    0..4080, in columns 2 .. W-3; 0 in the others
@@ -430,7 +466,6 @@ KEL_API void binalizeKelImageAdaptiveSSE_U8G(kelImage_t* dst, const kelImage_t* 
  *  - "tmp->type == KEL_PIXEL_TYPE_S16G"
  *
  * always from applyKelFilterGaussian5X5_downsampling(), which does the work; applyKelFilterGaussian5X5() passes no `half`.
- * @{
  */
 KEL_API void applyKelFilterGaussian5X5_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
 KEL_API void applyKelFilterGaussian5X5(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
@@ -438,6 +473,9 @@ KEL_API void applyKelFilterGaussian5X5(kelImage_t* dst, kelImage_t* src, kelImag
 
 /**
  * @name Gaussian 7x7
+ * @{
+ */
+/**
  * Smoothing of a U8G image with w = (2, 7, 14, 18, 14, 7, 2) / 64 in both directions, rounded after each:
  *
  *     tmp(x, y) = (sum w[i] * src(x + i - 3, y) + 32) >> 6
@@ -465,7 +503,6 @@ KEL_API void applyKelFilterGaussian5X5(kelImage_t* dst, kelImage_t* src, kelImag
  *
  * always from applyKelFilterGaussianSSE7X7_downsampling(), which does the work; the names without _downsampling pass no
  * `half`.
- * @{
  */
 KEL_API void applyKelFilterGaussianSSE7X7_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp);
 KEL_API void applyKelFilterGaussianSSE7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp);
@@ -475,6 +512,9 @@ KEL_API void applyKelFilterGaussian7X7(kelImage_t* dst, kelImage_t* src, kelImag
 
 /**
  * @name Cross operator
+ * @{
+ */
+/**
  * A Laplacian-like response of a U8G image in an S16G one of the same size. Its neighbours are FIVE pixels away, as the
  * keypoint detector wants them, although the name says 3X3:
  *
@@ -486,7 +526,6 @@ KEL_API void applyKelFilterGaussian7X7(kelImage_t* dst, kelImage_t* src, kelImag
  * Another source type returns before the destination's is looked at. Stops the process, always from
  * applyKelFilterLaplacianSSE3X3(), on "dst->step == src->step && dst->width == src->width && dst->height == src->height" and
  * "dst->type == KEL_PIXEL_TYPE_S16G".
- * @{
  */
 KEL_API void applyKelFilterLaplacianSSE3X3(kelImage_t* dst, kelImage_t* src);
 KEL_API void applyKelFilterLaplacian3X3(kelImage_t* dst, kelImage_t* src);
@@ -494,7 +533,10 @@ KEL_API void applyKelFilterLaplacian3X3(kelImage_t* dst, kelImage_t* src);
 
 /**
  * @name Sobel magnitude
- * Gradient magnitude (I. Sobel and G. Feldman, 1968) of a U8G image in an S16G one of the same size:
+ * @{
+ */
+/**
+ * Gradient magnitude (Irwin Sobel and Gary Feldman, 1968) of a U8G image in an S16G one of the same size:
  *
  *     gx = (left column, weights 1 2 1) - (right column),   gy = (row above, weights 1 2 1) - (row below)
  *     dst(x, y) = round(sqrt(gx^2 + gy^2))                                                      0..1442
@@ -508,7 +550,6 @@ KEL_API void applyKelFilterLaplacian3X3(kelImage_t* dst, kelImage_t* src);
  * Another source type returns before the destination's is looked at. Stops the process, always from
  * applyKelFilterSobelSSE3X3(), on "dst->step == src->step && dst->width == src->width && dst->height == src->height" and
  * "dst->type == KEL_PIXEL_TYPE_S16G".
- * @{
  */
 KEL_API void applyKelFilterSobelSSE3X3(kelImage_t* dst, kelImage_t* src);
 KEL_API void applyKelFilterSobel3X3(kelImage_t* dst, kelImage_t* src);
@@ -526,7 +567,7 @@ KEL_API void applyKelFilterSobel3X3(kelImage_t* dst, kelImage_t* src);
 KEL_API void applyKelFilterMedianNXN(kelImage_t* dst, kelImage_t* src, kelValue_s32 n);
 
 /** Inert: returns at once. Use applyKelFilterMedianNXN() with n = 1. */
-KEL_API void applyKelFilterMedian3X3(kelImage_t* dst, kelImage_t* src);
+KEL_API KEL_INERT void applyKelFilterMedian3X3(kelImage_t* dst, kelImage_t* src);
 
 /**
  * Adds uniform integer noise to a U8G image: dst = clamp(src - amplitude + rand() % (2 * amplitude + 1), 0, 255).
@@ -590,8 +631,8 @@ KEL_API kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoints,
  * expected where widths are multiples of 16.
  */
 
-/** Checks the types and resizes nothing. Stops the process on "dst->type == src->type". */
-KEL_API void resizeKelImage(kelImage_t* dst, const kelImage_t* src);
+/** Inert: checks the types and resizes nothing. Stops the process on "dst->type == src->type". */
+KEL_API KEL_INERT void resizeKelImage(kelImage_t* dst, const kelImage_t* src);
 
 /**
  * Nearest sample at whole-number ratios: dst(x, y) = src(trunc((x + 0.5) rx), trunc((y + 0.5) ry)) with rx = src->width /

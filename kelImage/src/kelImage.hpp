@@ -57,22 +57,29 @@ public:
     /** Takes over what createKelImage() or cloneKelImage() made, or null. Not for header-only images, whose pixels are another's. */
     explicit Image(kelImage_t* image) noexcept : m_image(image) {}
 
+    /** Takes the other's image and leaves it none. */
     Image(Image&& other) noexcept : m_image(other.release()) {}
+    /** Releases its own image and takes the other's. */
     Image& operator=(Image&& other) noexcept {
         Image taken(std::move(other));
         swap(taken);
         return *this;
     }
-    Image(const Image&) = delete;
-    Image& operator=(const Image&) = delete;
+    Image(const Image&) = delete;            ///< See clone().
+    Image& operator=(const Image&) = delete; ///< See clone().
+    /** Releases the image. */
     ~Image() { releaseKelImage(&m_image); }
 
+    /** Exchanges two images. */
     void swap(Image& other) noexcept { std::swap(m_image, other.m_image); }
 
     /** The record, for the functions of kelImage.h; it stays this object's. */
     kelImage_t* get() noexcept { return m_image; }
+    /** The same of a constant image. */
     const kelImage_t* get() const noexcept { return m_image; }
+    /** Its fields. */
     kelImage_t* operator->() noexcept { return m_image; }
+    /** The same of a constant image. */
     const kelImage_t* operator->() const noexcept { return m_image; }
 
     /** Whether there is an image. */
@@ -87,6 +94,7 @@ public:
 
     /** First byte of row y. */
     unsigned char* row(kelValue_s32 y) noexcept { return m_image->data + offset(y); }
+    /** The same of a constant image. */
     const unsigned char* row(kelValue_s32 y) const noexcept { return m_image->data + offset(y); }
 
     /** Bytes of a pixel. */

@@ -15,10 +15,25 @@
 
 #include <vector>
 
+#define KEL_VERSION_MAJOR 1 /**< Changes where programs have to be built anew. */
+#define KEL_VERSION_MINOR 0 /**< Grows with what is added. */
+#define KEL_VERSION_PATCH 0 /**< Grows with what is mended. */
+#define KEL_VERSION "1.0.0" /**< The three as text. */
+
 #if defined(__GNUC__)
 #define KEL_API __attribute__((visibility("default")))
 #else
 #define KEL_API
+#endif
+
+#if !defined(KEL_NO_INERT_WARNINGS) && defined(__has_attribute)
+#if __has_attribute(warning)
+#define KEL_INERT __attribute__((warning("does nothing")))
+#endif
+#endif
+#ifndef KEL_INERT
+/** Marks functions that do nothing: a call of one warns, unless KEL_NO_INERT_WARNINGS is defined before this header. */
+#define KEL_INERT
 #endif
 
 /**
@@ -39,7 +54,9 @@ public:
     /// A matrix of height rows and width columns, zero-filled where `zero` says so, else indeterminate; empty for a size
     /// below 1.
     KEL_API kelMat(int height = 0, int width = 0, bool zero = true);
+    /// A copy of its own.
     KEL_API kelMat(const kelMat& M);
+    /// Frees the storage.
     KEL_API ~kelMat();
 
     /// Frees the storage, then allocates anew, also for the same size; returns m_Data, null for a size below 1. Pointers into
@@ -78,8 +95,11 @@ public:
     /// By value, operands untouched. Between two matrices (the dot product excepted) an operand that is empty gives an empty
     /// result; after that the sizes must fit.
     /// @{
+    /// v added to every element.
     KEL_API kelMat operator+(float v) const;
+    /// v taken from every element.
     KEL_API kelMat operator-(float v) const;
+    /// Every element times v.
     KEL_API kelMat operator*(float v) const;
     /// Multiplies by 1 / v, computed once: the last bit may differ from a true division. v = 0 gives infinities or NaN.
     KEL_API kelMat operator/(float v) const;
@@ -100,6 +120,7 @@ public:
 
     /// T[r][c] = this[c][r], T being m_Width x m_Height; it must be another matrix. Always true.
     KEL_API bool getTransposedMatrix(kelMat& T) const;
+    /// The same by value.
     KEL_API kelMat getTransposedMatrix() const;
     /// Frobenius norm: root of the sum of squares in storage order; 0 for an empty matrix.
     KEL_API float getNorm() const;
@@ -117,8 +138,11 @@ public:
     KEL_API void cvtPoint(float x, float y, float z, float* u, float* v);
     /// 4x4. Stops on "this->m_Width == 4 && this->m_Height == 4".
     KEL_API void cvtPoint(float x, float y, float z, float* X, float* Y, float* Z);
+    /// The 3x3 form for integers.
     KEL_API void cvtPoint(int x, int y, int* u, int* v);
+    /// The 3x4 form for integers.
     KEL_API void cvtPoint(int x, int y, int z, int* u, int* v);
+    /// The 4x4 form for integers.
     KEL_API void cvtPoint(int x, int y, int z, int* X, int* Y, int* Z);
     /// @}
 
@@ -157,7 +181,7 @@ public:
     /// t and p are 0.
     KEL_API bool getAngleFromRotationMatrix_ZZYX_3x3(float& t, float& p, float& q);
     /// Inert: returns true, whatever the size, and leaves the outputs alone.
-    KEL_API bool getAngleFromRotationMatrix_ZYZ_3x3(float& t, float& p, float& q);
+    KEL_API KEL_INERT bool getAngleFromRotationMatrix_ZYZ_3x3(float& t, float& p, float& q);
     /// @}
 
     /// @name Decompositions
@@ -175,7 +199,7 @@ public:
     /// nr_ludcmp(); both are filled also where it is false. Stops on "this->m_Width == this->m_Height".
     KEL_API bool getDecomposedMatrix_LU(kelMat& L, kelMat& U) const;
     /// Inert: returns true and leaves both arguments alone.
-    KEL_API bool getDecomposedrixMat_QR(kelMat& Q, kelMat& R) const;
+    KEL_API KEL_INERT bool getDecomposedrixMat_QR(kelMat& Q, kelMat& R) const;
     /// Singular value decomposition U W V^T, nr_svdcmp() of this matrix.
     KEL_API bool getDecomposedMatrix_SV(kelMat& U, kelMat& W, kelMat& V) const;
     /// Eigenvalues (n x 1, not sorted) and eigenvectors (columns) of a symmetric matrix, by nr_jacobi() on a copy. Always true.
@@ -191,6 +215,7 @@ public:
     /// Closed forms for 2x2 and 3x3, LU beyond. Stop on "this->m_Width == this->m_Height", then "2 <= this->m_Width". Singular
     /// means a determinant of exactly 0, or beyond 3x3 a row of zeros; a nearly singular matrix gives very large elements.
     /// @{
+    /// The determinant, 0 for a singular matrix.
     KEL_API float getDeterminant() const;
     /// False for a singular matrix, R then as it was.
     KEL_API bool getInversedMatrix(kelMat& R) const;
@@ -248,9 +273,11 @@ KEL_API bool nr_jacobi(kelMat& a, kelMat& d, kelMat& v, int* nrot);
 
 /**
  * @name Determinants and inverses by size
+ * @{
+ */
+/**
  * What the members of kelMat choose from; the size is the caller's business, though an inverse in closed form takes the
  * determinant with getDeterminant() and stops as that does. Inverses are false for a singular matrix, R then as it was.
- * @{
  */
 KEL_API float kel_getDeterminant_2x2(const kelMat& A);
 KEL_API float kel_getDeterminant_3x3(const kelMat& A);
@@ -273,8 +300,9 @@ public:
     std::vector<float> m_DstX; ///< Second points, x.
     std::vector<float> m_DstY; ///< Second points, y.
 
+    /// An empty set.
     KEL_API kelMatCorrespH();
-    KEL_API ~kelMatCorrespH();
+    KEL_API ~kelMatCorrespH(); ///< Frees the pairs.
     /// Appends a pair; beyond KEL_CORRESP_MAX pairs it is dropped silently.
     KEL_API void add(float x1, float y1, float x2, float y2);
     /// Appends to `out` (empty before) the pairs with both point clouds centred and scaled to a mean distance of sqrt 2. T1
@@ -293,8 +321,9 @@ public:
     std::vector<float> m_ImgX; ///< Image points, x.
     std::vector<float> m_ImgY; ///< Image points, y.
 
+    /// An empty set.
     KEL_API kelMatCorrespP();
-    KEL_API ~kelMatCorrespP();
+    KEL_API ~kelMatCorrespP(); ///< Frees the pairs.
     /// Appends a pair; beyond KEL_CORRESP_MAX pairs it is dropped silently.
     KEL_API void add(float X, float Y, float Z, float x, float y);
     /// As kelMatCorrespH::normalize(), with a 4x4 T1; the object points, too, are scaled to a mean distance of sqrt 2.
@@ -310,8 +339,9 @@ KEL_API void UnitSquareProjection(float x0, float y0, float x1, float y1, float 
 /** The 3x3 homography from first to second points of a set. The estimator is the matrix; zero after construction. */
 class kelMatEstimatorH : public kelMat {
 public:
+    /// A 3x3 matrix of zeros.
     KEL_API kelMatEstimatorH();
-    KEL_API ~kelMatEstimatorH();
+    KEL_API ~kelMatEstimatorH(); ///< Frees the matrix.
     /// Exactly from four pairs, each given as x1, y1, x2, y2. Not rescaled. Always true: three points on a line give
     /// infinities or NaN.
     KEL_API bool estimate_by4P(float x1_0, float y1_0, float x2_0, float y2_0, float x1_1, float y1_1, float x2_1, float y2_1,
@@ -337,12 +367,14 @@ public:
     /// @param corresp   the pairs; four or more for a search, five inliers for a result
     /// @param threshold inlier distance, in the units of the second points
     /// @param inliers   receives the final fit's number of inliers on success; may be null
-    /// @return false, with `*inliers` untouched and the matrix holding no result, below four pairs (the matrix untouched), with
-    ///         fewer than five inliers, or where a refit is not plausible. True is no proof: check number and share of the inliers.
+    /// @return false, with `*inliers` untouched and the matrix holding no result, below four pairs (the matrix untouched), where no
+    ///         candidate of the search has five inliers, or where a refit is not plausible. The fit in the end may have fewer inliers
+    ///         than that candidate, also fewer than five. TRUE SAYS ONLY THAT SOMETHING WAS FITTED, as it nearly always is, also to
+    ///         pairs that have nothing to do with each other: test `*inliers` against the number of pairs before using the result.
     KEL_API bool estimate_byRANSAC_fine(kelMatCorrespH& corresp, float threshold, int* inliers);
 };
 
-/** Four indices drawn from 0 .. n-1 by rand(); c may equal a, any other two differ. n must be at least 4. */
+/** Four indices from 0 to n - 1 drawn by rand(); c may equal a, any other two differ. n must be at least 4. */
 KEL_API void getRandomIndex(int& a, int& b, int& c, int& d, int n);
 /**
  * Whether a homography (3x3, not checked) is plausible: no mirror (H00 H11 - H10 H01 >= 0), lengths of its first two columns' upper parts
@@ -360,8 +392,9 @@ KEL_API int judgeInliers(kelMat& H, kelMatCorrespH& corresp, std::vector<bool>& 
 /** The 3x4 projection from object to image points of a set. The estimator is the matrix; zero after construction. */
 class kelMatEstimatorP : public kelMat {
 public:
+    /// A 3x4 matrix of zeros.
     KEL_API kelMatEstimatorP();
-    KEL_API ~kelMatEstimatorP();
+    KEL_API ~kelMatEstimatorP(); ///< Frees the matrix.
     /// As kelMatEstimatorH::estimate_byLSM(), scaled so that P[2][3] is 1. False, and nothing written, below six pairs. The object
     /// points must not lie in one plane.
     KEL_API bool estimate_byLSM(kelMatCorrespP& corresp);
@@ -375,12 +408,12 @@ public:
     /// or printed, below six pairs.
     KEL_API bool estimate_byTaubin(kelMatCorrespP& corresp);
     /// Robust fit by RANSAC, as kelMatEstimatorH::estimate_byRANSAC_fine() with samples of six, at most 1500 candidates and none
-    /// after the first with 400 inliers; no test of plausibility. False below six pairs (the matrix untouched) or with fewer than six
-    /// inliers.
+    /// after the first with 400 inliers; no test of plausibility. False below six pairs (the matrix untouched) or where no candidate has
+    /// six inliers; true says only that something was fitted, as there: count with judgeInliers() before using it.
     KEL_API bool estimate_byRANSAC_fine(kelMatCorrespP& corresp, float threshold);
 };
 
-/** Six different indices drawn from 0 .. n-1 by rand(). n must be at least 6; it comes first here. */
+/** Six different indices from 0 to n - 1 drawn by rand(). n must be at least 6; it comes first here. */
 KEL_API void getRandomIndex(int n, int& a, int& b, int& c, int& d, int& e, int& f);
 /** Always true. */
 KEL_API bool judgeMatrixP(kelMat& P);
@@ -404,21 +437,28 @@ public:
 
     /// Camera at the origin, object 3000 units before it, scales 1, shifts 0, no focal length.
     KEL_API kelMatGeneratorP();
-    KEL_API ~kelMatGeneratorP();
+    KEL_API ~kelMatGeneratorP(); ///< Frees the matrices.
+    /// Sets the focal length, in matView.
     KEL_API void setMatView(float f);
     /// Focal length drawn uniformly between a and b, by rand().
     KEL_API void setMatViewRandom(float a, float b);
+    /// Sets matViewScale.
     KEL_API void setMatViewScale(float s);
+    /// Sets the principal point, in matViewShift.
     KEL_API void setMatViewShift(float u, float v);
     /// Rotation by setDataRotationMatrix_XYZ_3x3() angles in degrees, then translation.
     KEL_API void setMatCamera(float rx, float ry, float rz, float tx, float ty, float tz);
     /// setMatCamera() with each value drawn uniformly between its pair of bounds, in argument order, by rand().
     KEL_API void setMatCameraRandom(float rx_a, float rx_b, float ry_a, float ry_b, float rz_a, float rz_b, float tx_a,
                                     float tx_b, float ty_a, float ty_b, float tz_a, float tz_b);
+    /// As setMatCamera(), for the object.
     KEL_API void setMatObject(float rx, float ry, float rz, float tx, float ty, float tz);
+    /// As setMatCameraRandom(), for the object.
     KEL_API void setMatObjectRandom(float rx_a, float rx_b, float ry_a, float ry_b, float rz_a, float rz_b, float tx_a,
                                     float tx_b, float ty_a, float ty_b, float tz_a, float tz_b);
+    /// Sets matObjectScale.
     KEL_API void setMatObjectScale(float s);
+    /// Sets matObjectShift.
     KEL_API void setMatObjectShift(float x, float y, float z);
     /// The 3x4 product; zero until a focal length is set.
     KEL_API void getMat(kelMat& out);
