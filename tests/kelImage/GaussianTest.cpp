@@ -1,11 +1,9 @@
 // Gaussian 5x5 and 7x7: every byte of destination, half and scratch image beside the plain passes.
 #include <gtest/gtest.h>
-#include <numeric>
 
 #include "FilterReference.h"
 #include "GuardedImage.h"
 #include "Stops.h"
-#include "Valgrind.h"
 
 using kel_test::Bytes;
 using kel_test::Fill;
@@ -83,37 +81,7 @@ bool check(const Setting& setting) {
     return true;
 }
 
-std::vector<int> widths() {
-    std::vector<int> all(71);
-    std::iota(all.begin(), all.end(), 0);
-    for (int wide : {79, 80, 81, 88, 89, 95, 96, 97, 104, 105, 111, 112, 113, 127, 128, 129, 161})
-        all.push_back(wide);
-    return all;
-}
-
 } // namespace
-
-TEST(Gaussian, EqualsThePlainPassesAtEverySize) {
-    KEL_NOT_UNDER_VALGRIND("it adds only time");
-    int round = 0;
-    for (int width : widths())
-        for (int height : {0, 1, 4, 5, 6, 7, 8, 9, 10, 11, 16})
-            for (Half half : {Half::None, Half::Tight, Half::Padded})
-                for (bool inPlace : {false, true}) {
-                    const Guard guard = ++round % 2 ? Guard::Behind : Guard::Before;
-                    const Fill fill = round % 3 ? Fill::Random : kel_test::kFills[round / 3 % std::size(kel_test::kFills)];
-                    ASSERT_TRUE(check({width, height, guard, fill, half, inPlace}));
-                }
-}
-
-TEST(Gaussian, EqualsThePlainPassesOnEveryFill) {
-    KEL_NOT_UNDER_VALGRIND("it adds only time");
-    for (Fill fill : kel_test::kFills)
-        for (Guard guard : {Guard::Behind, Guard::Before})
-            for (bool inPlace : {false, true})
-                for (int width : {37, 56, 64, 200})
-                    ASSERT_TRUE(check({width, 41, guard, fill, Half::Tight, inPlace}));
-}
 
 // 7x7 goes by the scratch image's extent and reads the source's memory as far as that makes it.
 TEST(Gaussian, TakesALargerScratchImage) {
@@ -174,42 +142,6 @@ TEST(Gaussian, SpreadsAPointByItsWeights) {
     for (int v = 0; v < 7; ++v)
         for (int u = 0; u < 7; ++u) {
             EXPECT_EQ(dst.at(27 + u, 8 + v), ((255 * seven[u] + 32) / 64 * seven[v] + 32) / 64);
-        }
-}
-
-TEST(Gaussian, ForwardsEveryName) {
-    struct {
-        void (*plain)(kelImage_t*, kelImage_t*, kelImage_t*);
-        Smooth halving;
-        Filter filter;
-    } const names[] = {
-        {applyKelFilterGaussian5X5, applyKelFilterGaussian5X5_downsampling, kFilters[0]},
-        {applyKelFilterGaussianSSE7X7, applyKelFilterGaussianSSE7X7_downsampling, kFilters[1]},
-        {applyKelFilterGaussian7X7, applyKelFilterGaussian7X7_downsampling, kFilters[1]},
-    };
-    for (const auto& name : names) {
-        Image src(50, 20, KEL_PIXEL_TYPE_U8G), dst(50, 20, KEL_PIXEL_TYPE_U8G), expected(50, 20, KEL_PIXEL_TYPE_U8G);
-        Image half(25, 10, KEL_PIXEL_TYPE_U8G), expectedHalf(25, 10, KEL_PIXEL_TYPE_U8G), tmp(50, 20, name.filter.tmpType);
-        name.filter.reference(expected.get(), expectedHalf.get(), src.get(), tmp.get());
-        name.plain(dst.get(), src.get(), tmp.get());
-        EXPECT_TRUE(holds(dst, expected.bytes()));
-        dst.set(src.bytes());
-        expected.set(src.bytes());
-        name.filter.reference(expected.get(), expectedHalf.get(), src.get(), tmp.get());
-        name.halving(dst.get(), half.get(), src.get(), tmp.get());
-        EXPECT_TRUE(holds(dst, expected.bytes()));
-        EXPECT_TRUE(holds(half, expectedHalf.bytes()));
-    }
-}
-
-TEST(Gaussian, IgnoresOtherTypesBeforeItLooksAtTheScratchImage) {
-    for (int type = 1; type < 48; ++type)
-        for (int tmpType : {KEL_PIXEL_TYPE_U8G, KEL_PIXEL_TYPE_S16G, KEL_PIXEL_TYPE_U8XYZ}) {
-            Image src(40, 12, type), dst(40, 12, type), half(20, 6, type), tmp(40, 12, tmpType);
-            const Bytes before = dst.bytes(), tmpBefore = tmp.bytes(), halfBefore = half.bytes();
-            for (const Filter& filter : kFilters)
-                filter.smooth(dst.get(), half.get(), src.get(), tmp.get());
-            EXPECT_TRUE(holds(dst, before) && holds(tmp, tmpBefore) && holds(half, halfBefore)) << type;
         }
 }
 

@@ -5,6 +5,7 @@
 #include <limits>
 
 #include "GuardedImage.h"
+#include "ImageOperations.h"
 #include "Stops.h"
 #include "TransformReference.h"
 #include "Valgrind.h"
@@ -15,13 +16,8 @@ using kel_test::Bytes;
 using kel_test::Fill;
 using kel_test::Guard;
 using kel_test::Image;
+using kel_test::Size;
 using Operation = std::function<void(kelImage_t*, const kelImage_t*)>;
-
-const int kMoved[] = {0, 3, 8, 24, 16, 32}; // types that are moved as whole pixels
-
-struct Size {
-    int width, height;
-};
 
 // Runs an operation and its reference on guarded images, and expects the same destination and an untouched source.
 void compare(const Operation& operation, const Operation& reference, Size dstSize, Size srcSize, int type,
@@ -37,77 +33,16 @@ void compare(const Operation& operation, const Operation& reference, Size dstSiz
     EXPECT_TRUE(holds(src, source));
 }
 
-const int kWidths[] = {1,  2,  3,  4,  5,  6,  7,  8,  9,  10, 11, 12, 15, 16, 17, 18, 19, 20, 21, 23, 24,
-                       25, 30, 31, 32, 33, 34, 35, 36, 37, 40, 47, 48, 49, 50, 63, 64, 65, 66, 80, 97};
-
 } // namespace
 
-TEST(Flip, MovesEveryPixelOnceForAllWidthsAndPixelSizes) {
-    const struct {
-        void (*flip)(kelImage_t*, const kelImage_t*);
-        bool mirrored, upsideDown;
-    } flips[] = {{rotateKelImageH, true, false}, {rotateKelImageV, false, true}, {rotateKelImageVH, true, true}};
-    for (const auto& f : flips)
-        for (int type : kMoved)
-            for (int width = 0; width <= 70; ++width)
-                for (Guard guard : {Guard::Behind, Guard::Before})
-                    compare(
-                        f.flip,
-                        [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::flip(dst, src, f.mirrored, f.upsideDown); },
-                        {width, 1 + width % 3}, {width, 1 + width % 3}, type, guard);
-}
-
-TEST(Half, KeepsEverySecondPixelOfEverySecondRow) {
-    for (int type : kMoved)
-        for (int width = 1; width <= 140; ++width)
-            for (Guard guard : {Guard::Behind, Guard::Before})
-                compare(resizeKelImageHalf, kel_ref::half, {width / 2, width % 5 / 2}, {width, width % 5}, type, guard);
-}
-
-TEST(Nearest, SamplesAtWholeRatiosByWidth) {
+// Beyond the sizes where single precision is exact.
+TEST(Resizing, RoundsThePositionsOfHugeImages) {
     KEL_NOT_UNDER_VALGRIND("it adds only time");
-    for (int type : kMoved)
-        for (Size dst : {Size{1, 1}, Size{5, 3}, Size{12, 2}, Size{16, 4}, Size{17, 5}, Size{40, 3}})
-            for (int rx : {0, 1, 2, 3, 4, 5, 8})
-                for (int rest : {0, 1, 4})
-                    for (int ry : {0, 1, 2, 3})
-                        compare(resizeKelImageNearest, kel_ref::nearest, dst,
-                                {std::max(1, dst.width * rx + std::min(rest, dst.width - 1)), std::max(1, dst.height * ry)},
-                                type);
-    // Beyond the sizes where single precision is exact.
     compare(resizeKelImageNearest, kel_ref::nearest, {4200000, 1}, {12600001, 1}, 0);
     compare(resizeKelImageNearest, kel_ref::nearest, {6000000, 1}, {18000001, 1}, 0);
-}
-
-TEST(Bilinear, AveragesNeighboursAtWholeRatiosByWidth) {
-    KEL_NOT_UNDER_VALGRIND("it adds only time");
-    for (Fill fill : kel_test::kFills)
-        for (int width : kWidths)
-            for (int rx : {0, 1, 2, 3, 4, 5, 7})
-                for (int ry : {0, 1, 2, 3}) {
-                    const Size dst = {width, 3};
-                    compare(resizeKelImageBilinear, kel_ref::bilinear, dst,
-                            {std::max(1, width * rx + (rx ? (width - 1) / 2 : 0)), std::max(1, 3 * ry)}, 0, Guard::Behind,
-                            fill);
-                }
-    compare(resizeKelImageBilinear, kel_ref::bilinear, {31, 16}, {31, 17}, 0);
     compare(resizeKelImageBilinear, kel_ref::bilinear, {4200000, 1}, {12600001, 1}, 0);
     compare(resizeKelImageBilinear, kel_ref::bilinear, {6000000, 1}, {18000001, 1}, 0);
     compare(resizeKelImageBilinear, kel_ref::bilinear, {1400001, 1}, {4200004, 3}, 0);
-    compare(resizeKelImageBilinear, kel_ref::bilinear, {5, 3}, {15, 9}, KEL_PIXEL_TYPE_U8XYZ);
-}
-
-TEST(LinearInterpolation, EnlargesByAnyRatio) {
-    // One pixel behind the last is read: four bytes more.
-    for (Fill fill : {Fill::Random, Fill::Max, Fill::Alternating})
-        for (int from : {1, 2, 3, 5, 8, 16, 17})
-            for (int to : {1, 2, 3, 4, 5, 7, 8, 16, 17, 18, 33, 48})
-                if (to >= from)
-                    for (int rows : {1, 3, 4})
-                        for (int toRows : {4, 5, 9})
-                            compare(resizeLinerInterpolation, kel_ref::linearInterpolation, {to, toRows}, {from, rows}, 16,
-                                    Guard::Behind, fill, 4);
-    compare(resizeLinerInterpolation, kel_ref::linearInterpolation, {16, 16}, {16, 16}, 32, Guard::Behind, Fill::Random, 4);
 }
 
 // The pixel behind the source's last one is read as it is before the destination is written, also where it is the destination's.
@@ -127,18 +62,13 @@ TEST(LinearInterpolation, EnlargesIntoMemoryRightBehindItsSource) {
 }
 
 TEST(ZeroOrderHold, AveragesByAnyRatio) {
-    for (Fill fill : {Fill::Random, Fill::Max, Fill::Alternating})
-        for (int from : {1, 2, 3, 5, 8, 16, 17, 33, 64, 97})
-            for (int to : {1, 2, 3, 4, 5, 7, 8, 16, 17, 33, 64})
+    for (Fill fill : {Fill::Random, Fill::Max})
+        for (int from : {3, 17, 33, 64, 97})
+            for (int to : {1, 2, 5, 16, 17, 33, 64})
                 if (to <= from)
-                    for (int rows : {1, 3, 6, 17})
-                        for (int toRows : {1, 3, 4, 20})
-                            compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {to, toRows}, {from, rows}, 16,
-                                    Guard::Behind, fill);
-    for (int width = 1; width <= 36; ++width)
-        for (Fill fill : {Fill::Random, Fill::Alternating, Fill::Ramp})
-            compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {width, 3}, {2 * width, 6}, 16, Guard::Behind,
-                    fill);
+                    for (int toRows : {1, 3, 20}) // more rows, too
+                        compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {to, toRows}, {from, 6}, 16,
+                                Guard::Behind, fill);
     // Boxes too large for the reciprocal.
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 1}, {4099, 2}, 32);
     compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {3, 1}, {4106, 1}, 32);
@@ -154,22 +84,6 @@ TEST(ZeroOrderHold, AveragesOverHugeBoxes) {
     EXPECT_EQ(Bytes(dst->data, dst->data + 4), Bytes(4, 255));
     releaseKelImageHeader(&src);
     releaseKelImage(&dst);
-}
-
-TEST(Border, ReplicatesEdgesAndCropsThemAgain) {
-    KEL_NOT_UNDER_VALGRIND("it adds only time");
-    for (int type : kMoved)
-        for (int width : kWidths)
-            for (int height : {1, 2, 5})
-                for (int size : {0, 1, 2, 7, 16, 19}) {
-                    const Size outer = {width + 2 * size, height + 2 * size};
-                    compare([&](kelImage_t* dst, const kelImage_t* src) { resizeKelImageEnborder(dst, src, size); },
-                            [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::enborder(dst, src, size); }, outer,
-                            {width, height}, type);
-                    compare([&](kelImage_t* dst, const kelImage_t* src) { resizeKelImageDeborder(dst, src, size); },
-                            [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::deborder(dst, src, size); }, {width, height},
-                            outer, type);
-                }
 }
 
 namespace {
@@ -286,27 +200,6 @@ TEST(Transforms, WriteNothingForNegativeWidths) {
         EXPECT_TRUE(holds(memory, before));
         releaseKelImageHeader(&src);
         releaseKelImageHeader(&dst);
-    }
-}
-
-TEST(Transforms, IgnoreTypesThatTheyDoNotHandle) {
-    for (int type : {1, 7, 9, 40, 47, 48, -1}) {
-        Image dst(20, 4, type), src(20, 4, type);
-        Image half(10, 2, type);
-        const Bytes before = dst.bytes(), halfBefore = half.bytes();
-        const float identity[9] = {1, 0, 0, 0, 1, 0, 0, 0, 1};
-        resizeKelImage(dst.get(), src.get());
-        resizeKelImageNearest(dst.get(), src.get());
-        resizeKelImageBilinear(dst.get(), src.get());
-        resizeKelImageHalf(half.get(), src.get());
-        resizeKelImageEnborder(dst.get(), src.get(), 0);
-        resizeKelImageDeborder(dst.get(), src.get(), 0);
-        rotateKelImageH(dst.get(), src.get());
-        rotateKelImageV(dst.get(), src.get());
-        rotateKelImageVH(dst.get(), src.get());
-        warpBy(dst.get(), src.get(), identity);
-        EXPECT_TRUE(holds(dst, before));
-        EXPECT_TRUE(holds(half, halfBefore));
     }
 }
 

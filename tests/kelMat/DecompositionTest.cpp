@@ -146,7 +146,7 @@ TEST(Determinant, OfEverySize) {
     for (int n = 2; n <= 12; ++n)
         for (uint32_t salt = 0; salt < 20; ++salt) {
             const kelMat A = randomMatrix(n, n, 400 + salt);
-            Truth LU = reference<double>(A);
+            Truth LU = truth(A);
             std::vector<int> indx(n);
             double truth;
             kel_ref::ludcmp(LU, indx.data(), &truth);
@@ -174,10 +174,10 @@ TEST(Inverse, OfEverySize) {
             const kelMat A = randomMatrix(n, n, 600 + salt);
             kelMat R = mat({{1}});
             ASSERT_TRUE(A.getInversedMatrix(R));
-            Truth truth;
-            kel_ref::inverse(reference<double>(A), truth);
-            const double condition = norm(reference<double>(A)) * norm(truth);
-            EXPECT_LT(distance(reference<double>(R), truth), 2 * kEps * condition * norm(truth)) << n;
+            Truth expected;
+            kel_ref::inverse(truth(A), expected);
+            const double condition = norm(truth(A)) * norm(expected);
+            EXPECT_LT(distance(truth(R), expected), 2 * kEps * condition * norm(expected)) << n;
             if (n > 3) {
                 Reference plain;
                 kel_ref::inverse(reference(A), plain);
@@ -209,7 +209,7 @@ TEST(Inverse, OfMatricesWithMoreRowsThanColumns) {
         kelMat R;
         ASSERT_TRUE(A.getInversedMatrix_Pseudo(R));
         const Reference a = reference(A), t = kel_ref::transposed(a);
-        const Truth square = product(transposed(reference<double>(A)), reference<double>(A));
+        const Truth square = product(transposed(truth(A)), truth(A));
         Truth inverse;
         ASSERT_TRUE(kel_ref::inverse(square, inverse));
         const double condition = norm(square) * norm(inverse);

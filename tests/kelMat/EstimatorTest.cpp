@@ -1,30 +1,18 @@
 // Correspondence sets, homography and projection estimators against plain references, bit for bit, and against the truth.
 #include <cfenv>
 #include <cmath>
-#include <cstring>
 #include <fstream>
 #include <functional>
-#include <limits>
 
 #include "EstimatorReference.h"
+#include "MatSupport.h"
 #include "Memory.h"
-#include "Random.h"
 #include "Stops.h"
 #include "Valgrind.h"
 
 namespace {
 
-constexpr float kNaN = std::numeric_limits<float>::quiet_NaN();
-
-// Equal bits; any NaN equals any other.
-testing::AssertionResult sameBits(const kelMat& A, const kelMat& B) {
-    if (A.m_Width != B.m_Width || A.m_Height != B.m_Height)
-        return testing::AssertionFailure() << "sizes differ";
-    for (int i = 0; i < A.m_Width * A.m_Height; ++i)
-        if (std::memcmp(A.m_Data + i, B.m_Data + i, 4) != 0 && !(std::isnan(A.m_Data[i]) && std::isnan(B.m_Data[i])))
-            return testing::AssertionFailure() << "element " << i << " is " << A.m_Data[i] << ", expected " << B.m_Data[i];
-    return testing::AssertionSuccess();
-}
+using kel_test::same;
 
 float uniform(std::mt19937& random, float lo, float hi) {
     return std::uniform_real_distribution<float>(lo, hi)(random);
@@ -148,8 +136,8 @@ TEST(Correspondences, NormaliseAsTheReferenceDoes) {
         kelMat A1(2, 2, true), A2, B1, B2;
         h.normalize(h1, A1, A2);
         kel_ref::normalize(h, h2, B1, B2);
-        EXPECT_TRUE(sameBits(A1, B1));
-        EXPECT_TRUE(sameBits(A2, B2));
+        EXPECT_TRUE(same(A1, B1));
+        EXPECT_TRUE(same(A2, B2));
         EXPECT_EQ(h1.m_Num, n);
         if (n > 1) {
             EXPECT_EQ(h1.m_SrcX, h2.m_SrcX);
@@ -159,8 +147,8 @@ TEST(Correspondences, NormaliseAsTheReferenceDoes) {
         }
         p.normalize(p1, A1, A2);
         kel_ref::normalize(p, p2, B1, B2);
-        EXPECT_TRUE(sameBits(A1, B1));
-        EXPECT_TRUE(sameBits(A2, B2));
+        EXPECT_TRUE(same(A1, B1));
+        EXPECT_TRUE(same(A2, B2));
         if (n > 1) {
             EXPECT_EQ(p1.m_ObjX, p2.m_ObjX);
             EXPECT_EQ(p1.m_ObjY, p2.m_ObjY);
@@ -249,10 +237,10 @@ TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
         kelMatEstimatorH H, expected;
         EXPECT_TRUE(H.estimate_byLSM(h));
         kel_ref::leastSquares(expected, h);
-        EXPECT_TRUE(sameBits(H, expected));
+        EXPECT_TRUE(same(H, expected));
         EXPECT_TRUE(H.estimate_byLSM_fine(h));
         kel_ref::leastSquaresFine(expected, h, 5);
-        EXPECT_TRUE(sameBits(H, expected));
+        EXPECT_TRUE(same(H, expected));
         EXPECT_NEAR(H[2][2], 1, 1e-6);
         EXPECT_LT(distanceOf(H, truth), n == 7 ? 60.0f : 8.0f) << n;
         if (n < 6)
@@ -260,10 +248,10 @@ TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
         kelMatEstimatorP Q, expectedP;
         EXPECT_TRUE(Q.estimate_byLSM(p));
         kel_ref::leastSquares(expectedP, p);
-        EXPECT_TRUE(sameBits(Q, expectedP));
+        EXPECT_TRUE(same(Q, expectedP));
         EXPECT_TRUE(Q.estimate_byLSM_fine(p));
         kel_ref::leastSquaresFine(expectedP, p, 6);
-        EXPECT_TRUE(sameBits(Q, expectedP));
+        EXPECT_TRUE(same(Q, expectedP));
         if (n >= 20) {
             EXPECT_LT(distanceOfProjections(Q, P), 6.0f) << n;
         }
@@ -281,11 +269,11 @@ TEST(LeastSquares, TakesTheFirstOfEqualSingularValues) {
     kelMatEstimatorH H, expected;
     H.estimate_byLSM(h);
     kel_ref::leastSquares(expected, h);
-    EXPECT_TRUE(sameBits(H, expected));
+    EXPECT_TRUE(same(H, expected));
     kelMatEstimatorP P, expectedP;
     P.estimate_byLSM(p);
     kel_ref::leastSquares(expectedP, p);
-    EXPECT_TRUE(sameBits(P, expectedP));
+    EXPECT_TRUE(same(P, expectedP));
 }
 
 namespace {
@@ -298,7 +286,7 @@ void expectTaubinLikeReference(kelMatCorrespP& set) {
     testing::internal::CaptureStdout();
     kel_ref::taubin(expected, set);
     EXPECT_EQ(printed, testing::internal::GetCapturedStdout());
-    EXPECT_TRUE(sameBits(P, expected));
+    EXPECT_TRUE(same(P, expected));
     EXPECT_EQ(printed.compare(0, 8, "M\n<mat>\n"), 0);
 }
 
@@ -329,7 +317,7 @@ TEST(Taubin, EqualsTheReferenceAndFindsTheTruth) {
         kelMatEstimatorH H, expected;
         EXPECT_TRUE(H.estimate_byTaubin(h));
         kel_ref::taubin(expected, h);
-        EXPECT_TRUE(sameBits(H, expected));
+        EXPECT_TRUE(same(H, expected));
         kel_ref::denormalize(H, T2, T1);
         EXPECT_LT(distanceOf(H, truth), 8.0f) << n;
 
@@ -345,7 +333,7 @@ TEST(Taubin, FillsWithNaNWhereTheEigenproblemHasNoSolution) {
     for (int i = 0; i < 8; ++i) {
         onAxis.add(float(i), 0, float(i), 0);
         atOrigin.add(0, 0, 0, 0);
-        notANumber.add(kNaN, float(i), 1, float(i * i));
+        notANumber.add(kel_test::kNan, float(i), 1, float(i * i));
         plane.add(float(i), float(i * i % 5), 0, float(i), float(i % 3));
     }
     for (kelMatCorrespH* set : {&onAxis, &notANumber, &atOrigin}) {
@@ -379,8 +367,8 @@ TEST(Fits, RefuseSmallSetsAndKeepTheirContents) {
     addPairs(three, homography(random), 3, 0, 0, random);
     int count = 99;
     EXPECT_FALSE(H.estimate_byRANSAC_fine(three, 1, &count));
-    EXPECT_TRUE(sameBits(H, beforeH));
-    EXPECT_TRUE(sameBits(P, beforeP));
+    EXPECT_TRUE(same(H, beforeH));
+    EXPECT_TRUE(same(P, beforeP));
     EXPECT_EQ(count, 99);
     EXPECT_EQ(testing::internal::GetCapturedStdout(), "");
 }
@@ -442,7 +430,7 @@ TEST(Plausibility, HasAbsoluteBoundsThatNaNPasses) {
         EXPECT_TRUE(judge([=](kelMat& H) { H[2][i] = 0.001f; }));
     }
     EXPECT_TRUE(judge([](kelMat& H) { H[0][1] = H[1][0] = H[0][0] = H[1][1] = 1; })) << "zero area passes";
-    EXPECT_TRUE(judge([](kelMat& H) { std::fill_n(H.m_Data, 9, kNaN); }));
+    EXPECT_TRUE(judge([](kelMat& H) { std::fill_n(H.m_Data, 9, kel_test::kNan); }));
     EXPECT_TRUE([] {
         kelMat zero(3, 4, true);
         return judgeMatrixP(zero);
@@ -458,7 +446,7 @@ TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
         addPairs(h, H, n, 2, 0.3f, random);
         addPairs(p, P, n, 2, 0.3f, random);
         if (n > 5)
-            h.m_SrcX[5] = p.m_ObjX[5] = kNaN;
+            h.m_SrcX[5] = p.m_ObjX[5] = kel_test::kNan;
         for (float threshold : {0.0f, 0.5f, 1.5f, -1.5f, 1e20f}) {
             std::vector<bool> mask(n + 3, true), expected(n + 3, true);
             EXPECT_EQ(judgeInliers(H, h, mask, threshold), kel_ref::inliers(H, h, expected, threshold));
@@ -504,7 +492,7 @@ void expectRansacLikeReference(kelMatCorrespH& set, unsigned seed) {
     EXPECT_EQ(ok, kel_ref::ransac(expected, set, 2, &expectedCount, {5, 4, 50, true}));
     EXPECT_EQ(next, rand()) << "the number of draws";
     EXPECT_EQ(count, expectedCount);
-    EXPECT_TRUE(sameBits(H, expected));
+    EXPECT_TRUE(same(H, expected));
 }
 
 void expectRansacLikeReference(kelMatCorrespP& set, unsigned seed) {
@@ -515,7 +503,7 @@ void expectRansacLikeReference(kelMatCorrespP& set, unsigned seed) {
     srand(seed);
     EXPECT_EQ(ok, kel_ref::ransac(expected, set, 4, nullptr, {6, 6, 400, false}));
     EXPECT_EQ(next, rand()) << "the number of draws";
-    EXPECT_TRUE(sameBits(P, expected));
+    EXPECT_TRUE(same(P, expected));
 }
 
 } // namespace
@@ -627,8 +615,8 @@ TEST(Generator, DrawsItsValuesInArgumentOrder) {
     kelMat P, expected;
     random.getMat(P);
     fixed.getMat(expected);
-    EXPECT_TRUE(sameBits(P, expected));
-    random.setMatViewRandom(1, kNaN);
+    EXPECT_TRUE(same(P, expected));
+    random.setMatViewRandom(1, kel_test::kNan);
     EXPECT_TRUE(std::isnan(random.matView[0][0])) << "bounds are swapped only where the first is larger";
 }
 

@@ -11,12 +11,11 @@
 #include <kel/kelMat.h>
 #include <limits>
 
-#include "MatReference.h"
+#include "MatOperations.h"
 #include "Random.h"
 
 namespace kel_test {
 
-using Reference = kel_ref::Mat<float>;
 using Truth = kel_ref::Mat<double>;
 
 constexpr double kEps = std::numeric_limits<float>::epsilon();
@@ -31,10 +30,11 @@ inline kelMat mat(std::initializer_list<std::initializer_list<float>> rows) {
     return M;
 }
 
-template <class T = float> kel_ref::Mat<T> reference(const kelMat& M) {
-    kel_ref::Mat<T> R(M.m_Height, M.m_Width);
-    std::copy_n(M.m_Data, R.data.size(), R.data.begin());
-    return R;
+inline Truth truth(const kelMat& M) {
+    const Reference R = reference(M);
+    Truth T(R.rows, R.columns);
+    std::copy(R.data.begin(), R.data.end(), T.data.begin());
+    return T;
 }
 
 inline kelMat matrix(const Reference& R) {
@@ -64,11 +64,6 @@ inline testing::AssertionResult sameSize(const kelMat& M, int rows, int columns)
         return testing::AssertionSuccess();
     return testing::AssertionFailure() << "the matrix is " << M.m_Height << " x " << M.m_Width << ", created " << M.m_IsCreated
                                        << "; expected " << rows << " x " << columns;
-}
-
-// Equal bits; any NaN equals any other.
-inline bool sameFloat(float a, float b) {
-    return std::memcmp(&a, &b, sizeof a) == 0 || (std::isnan(a) && std::isnan(b));
 }
 
 inline testing::AssertionResult same(const kelMat& M, const Reference& expected) {

@@ -80,7 +80,7 @@ TEST(RotationBuilders, ComposeAxesInTheirOrder) {
             kelMat R(4, 4);
             (R.*each.builder)(a, b, c);
             ASSERT_TRUE(sameSize(R, 3, 3));
-            EXPECT_LT(distance(reference<double>(R), each.truth(a, b, c)), 8 * kEps) << a << " " << b << " " << c;
+            EXPECT_LT(distance(truth(R), each.truth(a, b, c)), 8 * kEps) << a << " " << b << " " << c;
         }
 }
 

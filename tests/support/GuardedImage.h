@@ -27,10 +27,13 @@ inline Bytes filled(size_t bytes, Fill fill, uint32_t salt) {
     Bytes result(bytes);
     std::mt19937 random = generator(salt);
     uint8_t run = 0;
+    uint32_t bits = 0;
     for (size_t i = 0; i < bytes; ++i) {
         switch (fill) {
         case Fill::Random:
-            result[i] = static_cast<uint8_t>(random());
+            if (i % 4 == 0)
+                bits = random();
+            result[i] = static_cast<uint8_t>(bits >> 8 * (i % 4));
             break;
         case Fill::Zero:
             result[i] = 0;

@@ -1,0 +1,236 @@
+// Every image operation of the list beside its reference, byte for byte, padding, margins and neighbours included; and under
+// valgrind, with nothing but its source's pixels determined.
+#include <cfenv>
+#include <climits>
+#include <cstdlib>
+#include <optional>
+#include <set>
+
+#include "GuardedImage.h"
+#include "ImageOperations.h"
+#include "PointReference.h"
+#include "Sweep.h"
+#include "TransformReference.h"
+#include "Valgrind.h"
+
+namespace {
+
+using namespace kel_test;
+using kel_ref::wholeBlocks;
+
+// How one call is made.
+struct Setting {
+    Size src;
+    int parameter = 0;
+    Guard guard = Guard::Behind;
+    Fill fill = Fill::Random;
+    bool inPlace = false;
+    int half = -1;           // columns that it is wider than it has to be; negative for null
+    Size dst = {INT_MIN, 0}; // where it is not what the operation makes of the source's
+    ptrdiff_t spare = 0;     // bytes behind the data; negative where rows end with their last pixel
+};
+
+std::ostream& operator<<(std::ostream& out, const Setting& s) {
+    return out << s.src.width << "x" << s.src.height << ", parameter " << s.parameter << ", fill " << static_cast<int>(s.fill)
+               << (s.inPlace ? ", in place" : "") << (s.half < 0 ? "" : ", with half");
+}
+
+// The images of a call, the same contents every time.
+class Scene {
+public:
+    Scene(const ImageOperation& o, const Setting& s, int type)
+        : m_operation(o), m_setting(s), m_src(s.src.width, s.src.height, type, s.guard, o.behind + spare(s.src.width, type)),
+          m_dst(dstSize().width, dstSize().height, type == o.from ? o.to : type, s.guard,
+                extra() + spare(dstSize().width, o.to)) {
+        if (s.fill != Fill::Random)
+            m_src.fill(s.fill, 5);
+        if (o.tmp != kNoType)
+            m_tmp.emplace(s.src.width, s.src.height, o.tmp, s.guard);
+        if (s.half >= 0)
+            m_half.emplace((std::max(s.src.width, 0) + 1) / 2 + s.half, (s.src.height + 1) / 2, 0, s.guard);
+    }
+    void apply(const ImageCall& call) const {
+        call({m_setting.inPlace ? m_src.get() : m_dst.get(), m_src.get(), m_tmp ? m_tmp->get() : nullptr,
+              m_half ? m_half->get() : nullptr, m_setting.parameter});
+    }
+    testing::AssertionResult equals(const Scene& other) const {
+        if (auto result = holds(m_dst, other.m_dst.bytes()); !result)
+            return result;
+        if (auto result = holds(m_src, other.m_src.bytes()); !result)
+            return result << " (source)";
+        if (auto result = m_tmp ? holds(*m_tmp, other.m_tmp->bytes()) : testing::AssertionSuccess(); !result)
+            return result << " (scratch)";
+        return m_half ? holds(*m_half, other.m_half->bytes()) << " (half)" : testing::AssertionSuccess();
+    }
+
+    // All but the source's pixels.
+    void makeIndeterminate() const {
+        VALGRIND_MAKE_MEM_UNDEFINED(m_dst.data(), m_dst.size());
+        if (m_tmp)
+            VALGRIND_MAKE_MEM_UNDEFINED(m_tmp->data(), m_tmp->size());
+        const int bytes = m_src->channels * m_src->depth;
+        for (int y = 0; y < m_src->height; ++y)
+            VALGRIND_MAKE_MEM_UNDEFINED(m_src.data() + (y * m_src->step + m_src->width) * bytes,
+                                        (m_src->step - m_src->width) * bytes);
+    }
+    bool isSettled() const {
+        const int bytes = m_dst->channels * m_dst->depth;
+        const auto& margin = m_operation.settled;
+        for (int y = margin.top; y < m_dst->height - margin.bottom; ++y)
+            if (VALGRIND_CHECK_MEM_IS_DEFINED(m_dst.data() + (y * m_dst->step + margin.left) * bytes,
+                                              (m_dst->width - margin.left - margin.right) * bytes) != 0)
+                return false;
+        return true;
+    }
+
+private:
+    Size dstSize() const {
+        return m_setting.dst.width == INT_MIN ? m_operation.size(m_setting.src, m_setting.parameter) : m_setting.dst;
+    }
+    size_t spare(int width, int type) const {
+        if (m_setting.spare >= 0)
+            return static_cast<size_t>(m_setting.spare);
+        return size_t(0) - static_cast<size_t>((wholeBlocks(width) - width) * kel_ref::wholePixelBytes(type));
+    }
+    size_t extra() const { return roomFor(m_operation, dstSize()) / m_operation.room * (m_operation.room - 1); }
+
+    const ImageOperation& m_operation;
+    const Setting m_setting;
+    Image m_src, m_dst;
+    std::optional<Image> m_tmp, m_half;
+};
+
+// Some way to call an operation on a source of this size.
+Setting any(const ImageOperation& o, Size src) {
+    static std::mt19937 random = generator(7);
+    Setting s = {src, o.parameters[random() % o.parameters.size()]};
+    s.guard = random() % 2 ? Guard::Behind : Guard::Before;
+    s.fill = random() % 3 ? Fill::Random : kFills[random() % std::size(kFills)];
+    s.inPlace = o.inPlace && random() % 3 == 0;
+    s.half = o.half && random() % 4 ? 16 * (random() % 2) : -1;
+    s.spare = random() % 4 ? 0 : 4; // data need no more alignment than their elements
+    return s;
+}
+
+testing::AssertionResult agrees(const ImageOperation& o, const Setting& setting, int rounding = FE_TONEAREST) {
+    const Size dst = o.size(setting.src, setting.parameter);
+    if (std::min(setting.src.width, dst.width) < o.leastWidth || dst.height < 0)
+        return testing::AssertionSuccess(); // nothing of the kind
+    const Scene actual(o, setting, o.from), expected(o, setting, o.from);
+    std::fesetround(rounding);
+    srand(42);
+    expected.apply(o.reference);
+    const int next = rand();
+    srand(42);
+    actual.apply(o.call);
+    std::fesetround(FE_TONEAREST);
+    if (rand() != next)
+        return testing::AssertionFailure() << "another number of draws, " << setting;
+    return actual.equals(expected) << ", " << setting;
+}
+
+// Runs check(operation) for all of the list.
+template <class Check> void forEveryOperation(Check check) {
+    for (const ImageOperation& o : imageOperations()) {
+        SCOPED_TRACE(o.name);
+        check(o);
+    }
+}
+
+} // namespace
+
+TEST(ImageOperations, EqualTheirReferencesAtEverySize) {
+    forEveryOperation([](const ImageOperation& o) {
+        size_t round = 0;
+        const size_t count = RUNNING_ON_VALGRIND ? 1 : std::min<size_t>(o.heights.size(), 5);
+        for (int width : widths())
+            for (size_t i = 0; i < count; ++i, ++round)
+                if (round % o.stride == 0) {
+                    ASSERT_TRUE(agrees(o, any(o, {width, o.heights[round % o.heights.size()]})));
+                }
+    });
+}
+
+TEST(ImageOperations, EqualTheirReferencesOnEveryFillAndParameter) {
+    KEL_NOT_UNDER_VALGRIND("it adds only time");
+    forEveryOperation([](const ImageOperation& o) {
+        for (Fill fill : kFills)
+            for (int parameter : o.parameters)
+                for (int width : {48, 83, 203}) {
+                    Setting setting = any(o, {width, 41});
+                    setting.fill = fill;
+                    setting.parameter = parameter;
+                    ASSERT_TRUE(agrees(o, setting));
+                }
+    });
+}
+
+TEST(ImageOperations, GoByTheDestinationsSizeWhereTheyCheckNone) {
+    forEveryOperation([](const ImageOperation& o) {
+        for (Size dst : {Size{1, 4}, Size{15, 2}, Size{20, 9}, Size{33, 41}, Size{70, 40}}) {
+            Setting setting = any(o, {70, 50});
+            setting.dst = dst;
+            if (!o.checked && !setting.inPlace) {
+                ASSERT_TRUE(agrees(o, setting));
+            }
+        }
+    });
+}
+
+// Data areas that end with the last row's last pixel instead of its padding.
+TEST(ImageOperations, NeedNoPaddingWhereTheyPromiseIt) {
+    forEveryOperation([](const ImageOperation& o) {
+        for (int width : widths()) {
+            Setting setting = any(o, {width, 3});
+            setting.guard = Guard::Behind;
+            setting.spare = -1;
+            if (o.withinPixels && width > 0 && o.size(setting.src, setting.parameter).height > 0) {
+                ASSERT_TRUE(agrees(o, setting));
+            }
+        }
+    });
+}
+
+TEST(ImageOperations, FollowTheThreadsRoundingMode) {
+    forEveryOperation([](const ImageOperation& o) {
+        for (const RoundingMode& mode : kRoundingModes)
+            for (int width : {301, 1024})
+                if (o.rounds) {
+                    ASSERT_TRUE(agrees(o, any(o, {width, 30}), mode.mode)) << "rounding " << mode.name;
+                }
+    });
+}
+
+TEST(ImageOperations, LeaveImagesOfOtherTypesAlone) {
+    const auto function = [](const ImageOperation& o) { return o.name.substr(0, o.name.find(' ')); };
+    std::set<std::pair<std::string, int>> handled;
+    for (const ImageOperation& o : imageOperations())
+        handled.insert({function(o), o.from});
+    forEveryOperation([&](const ImageOperation& o) {
+        for (int type = -1; o.byType && type < 50; ++type)
+            if (!handled.count({function(o), type})) {
+                const Setting setting = {{41, 40}, o.parameters[0]};
+                const Scene untouched(o, setting, type), images(o, setting, type);
+                images.apply(o.call);
+                EXPECT_TRUE(images.equals(untouched)) << "type " << type;
+            }
+    });
+}
+
+// Nothing but the source's pixels is determined: no byte beside them decides anything, or reaches what is documented to be free of
+// it.
+TEST(ImageOperations, DecideNothingByIndeterminateBytes) {
+    if (!RUNNING_ON_VALGRIND)
+        GTEST_SKIP() << "valgrind has something to say here";
+    forEveryOperation([](const ImageOperation& o) {
+        if (o.settledWidth == 0)
+            return;
+        const Setting setting = {{o.settledWidth, 50}, o.parameters[0]};
+        const Scene images(o, setting, o.from);
+        images.makeIndeterminate();
+        images.apply(o.call);
+        if (o.room == 1) {
+            EXPECT_TRUE(images.isSettled());
+        }
+    });
+}

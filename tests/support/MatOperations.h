@@ -1,0 +1,34 @@
+// Every kernel of matrices once, with its plain reference: what unit tests, threads and fuzz targets go through.
+#ifndef KEL_TESTS_MAT_OPERATIONS_H
+#define KEL_TESTS_MAT_OPERATIONS_H
+
+#include <kel/kelMat.h>
+#include <string>
+#include <vector>
+
+#include "MatReference.h"
+
+namespace kel_test {
+
+using Reference = kel_ref::Mat<float>;
+using Floats = std::vector<float>; // results of an operation, sizes and truth values included, one behind the other
+
+struct MatOperation {
+    const char* name;
+    Floats (*call)(kelMat A, kelMat B);
+    Floats (*reference)(Reference A, Reference B);
+    enum Form { Any, Square, Symmetric } form = Square; // of A; B is as wide and high, positive definite where A is symmetric
+    int least = 1;                                      // order that it is for
+};
+
+const std::vector<MatOperation>& matOperations();
+
+Reference reference(const kelMat& M);
+
+// Equal bits; any NaN equals any other.
+bool sameFloat(float a, float b);
+bool sameFloats(const Floats& a, const Floats& b);
+
+} // namespace kel_test
+
+#endif
