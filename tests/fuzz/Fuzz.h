@@ -12,6 +12,8 @@
 #include <random>
 #include <vector>
 
+#include "ImageOperations.h"
+
 namespace kel_fuzz {
 
 [[noreturn]] inline void fail(const char* what) {
@@ -61,22 +63,14 @@ private:
 
 using kel::Image;
 
-// An image whose data area is a heap block of just its size (and `extra` bytes), so that the sanitizer sees every step beside it.
-inline Image image(int width, int height, int type, size_t extra = 0) {
-    Image result(createKelImageHeader(width, height, type));
-    result->buffer = malloc(static_cast<size_t>(result->size) + extra); // owned by the record as the library's own block is
-    result->data = static_cast<uint8_t*>(result->buffer);
-    return result;
-}
-
 // Two images with the same bytes: `lib` for the library, `ref` for the reference.
 struct Twins {
     Image lib, ref;
     size_t bytes;
 
     Twins(Input& input, int width, int height, int type, size_t extra = 0)
-        : lib(image(width, height, type, extra)), ref(image(width, height, type, extra)),
-          bytes(static_cast<size_t>(lib->size) + extra) {
+        : lib(kel_test::imageWithRoom({width, height}, type, extra)),
+          ref(kel_test::imageWithRoom({width, height}, type, extra)), bytes(static_cast<size_t>(lib->size) + extra) {
         input.fill(lib->data, bytes);
         std::memcpy(ref->data, lib->data, bytes);
     }

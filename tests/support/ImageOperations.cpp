@@ -3,6 +3,7 @@
 
 #include <algorithm>
 #include <climits>
+#include <cstdlib>
 #include <iterator>
 
 #include "ConverterReference.h"
@@ -295,6 +296,13 @@ size_t roomFor(const ImageOperation& operation, Size dst) {
     const size_t bytes = static_cast<size_t>(header->size) * static_cast<size_t>(operation.room);
     releaseKelImageHeader(&header);
     return bytes;
+}
+
+kel::Image imageWithRoom(Size size, int type, size_t extra) {
+    kel::Image image(createKelImageHeader(size.width, size.height, type));
+    image->buffer = malloc(static_cast<size_t>(image->size) + extra); // owned by the record as the library's own block is
+    image->data = static_cast<uint8_t*>(image->buffer);
+    return image;
 }
 
 } // namespace kel_test

@@ -5,7 +5,7 @@
 
 #include <cstddef>
 #include <functional>
-#include <kel/kelImage.h>
+#include <kel/kelImage.hpp>
 #include <string>
 #include <vector>
 
@@ -55,6 +55,9 @@ const std::vector<ImageOperation>& imageOperations();
 
 // Bytes of the destination's data area.
 size_t roomFor(const ImageOperation& operation, Size dst);
+
+// An image whose data area is a heap block of just its size and `extra` bytes, so that a sanitizer sees every step beside it.
+kel::Image imageWithRoom(Size size, int type, size_t extra = 0);
 
 } // namespace kel_test
 

@@ -14,34 +14,24 @@ namespace {
 
 using namespace kel_test;
 
-// An image with known bytes, padding included, and room behind them.
-class Owned {
-public:
-    Owned(Size size, int type, size_t extra, uint32_t salt) : m_image(createKelImageHeader(size.width, size.height, type)) {
-        std::mt19937 random = generator(salt);
-        m_bytes.resize(static_cast<size_t>(m_image->size) + extra + 64);
-        std::generate(m_bytes.begin(), m_bytes.end(), [&] { return static_cast<unsigned char>(random()); });
-        m_image->data = m_bytes.data();
-    }
-    ~Owned() { releaseKelImageHeader(&m_image); }
-    Owned(const Owned&) = delete;
-    Owned& operator=(const Owned&) = delete;
-    kelImage_t* get() const { return m_image; }
-    const std::vector<unsigned char>& bytes() const { return m_bytes; }
-
-private:
-    kelImage_t* m_image;
-    std::vector<unsigned char> m_bytes;
-};
-
 using Result = std::vector<unsigned char>;
+
+// With known bytes, padding and the room behind included.
+kel::Image noise(Size size, int type, size_t extra, uint32_t salt) {
+    kel::Image image = imageWithRoom(size, type, extra);
+    std::mt19937 random = generator(salt);
+    std::generate_n(image->data, static_cast<size_t>(image->size) + extra,
+                    [&] { return static_cast<unsigned char>(random()); });
+    return image;
+}
 
 Result resultOf(const ImageOperation& o) {
     const Size src = {64, 48}, dst = o.size(src, o.parameters[0]);
-    const Owned from(src, o.from, o.behind, 1), to(dst, o.to, roomFor(o, dst), 2), tmp(src, std::max(o.tmp, 0), 0, 3),
-        half({48, 24}, 0, 0, 4);
+    const size_t room = roomFor(o, dst), spare = room / o.room * (o.room - 1);
+    kel::Image from = noise(src, o.from, o.behind, 1), to = noise(dst, o.to, spare, 2),
+               tmp = noise(src, std::max(o.tmp, 0), 0, 3), half = noise({48, 24}, 0, 0, 4);
     o.call({to.get(), from.get(), tmp.get(), o.half ? half.get() : nullptr, o.parameters[0]});
-    return o.draws ? Result() : to.bytes(); // draws from rand() are shared out among the threads
+    return o.draws ? Result() : Result(to->data, to->data + room); // draws from rand() are shared out among the threads
 }
 
 Result resultOf(const MatOperation& o) {
@@ -58,7 +48,7 @@ Result resultOf(const MatOperation& o) {
 }
 
 Result resultOfKeypoints() {
-    const Owned grey({64, 48}, KEL_PIXEL_TYPE_U8G, 0, 6), response({64, 48}, KEL_PIXEL_TYPE_S16G, 0, 7);
+    kel::Image grey = noise({64, 48}, KEL_PIXEL_TYPE_U8G, 0, 6), response = noise({64, 48}, KEL_PIXEL_TYPE_S16G, 0, 7);
     kelKeypoint2DF32_t keypoints[200];
     const int count = applyKelDetectorKeypointYape(keypoints, 200, grey.get(), response.get());
     Result bytes(static_cast<size_t>(count) * sizeof keypoints[0]);
