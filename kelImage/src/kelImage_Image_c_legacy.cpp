@@ -16,6 +16,7 @@ kelValue_s32 wrappingMultiply(kelValue_s32 a, kelValue_s32 b) {
 }
 
 constexpr kelValue_s32 kAlignment = 16; // bytes of a vector, and pixels that `step` is a multiple of
+constexpr size_t kCacheLine = 64;       // what blocks start with, so that wide vectors do not straddle lines; nobody relies on it
 
 void copyRows(unsigned char* dst, ptrdiff_t dstPitch, const unsigned char* src, ptrdiff_t srcPitch, size_t bytes,
               kelValue_s32 rows) {
@@ -51,7 +52,8 @@ kelImage_t* createKelImage(kelValue_s32 width, kelValue_s32 height, kelValue_s32
     kelImage_t* const image = createKelImageHeader(width, height, type);
     // Widened with its sign: a negative sum asks for more than there is, malloc refuses, and data stays null.
     const ptrdiff_t bytes = wrappingAdd(image->size, kAlignment - 1);
-    image->buffer = malloc(static_cast<size_t>(bytes));
+    if (posix_memalign(&image->buffer, kCacheLine, static_cast<size_t>(bytes)) != 0)
+        image->buffer = nullptr;
     const uintptr_t block = reinterpret_cast<uintptr_t>(image->buffer);
     image->data = reinterpret_cast<unsigned char*>((block + kAlignment - 1) & ~uintptr_t(kAlignment - 1));
     return image;

@@ -238,6 +238,9 @@ inline Floats2 operator/(Floats2 a, Floats2 b) {
 inline Floats2 rootOf(Floats2 a) {
     return {_mm256_sqrt_ps(a.f)};
 }
+inline Floats2 bitsAsFloats(Lanes2 longs) {
+    return {_mm256_castsi256_ps(longs.v)};
+}
 inline Floats2 floatsOf(Lanes2 longs) {
     return {_mm256_cvtepi32_ps(longs.v)};
 }

@@ -276,6 +276,9 @@ inline Floats4 operator/(Floats4 a, Floats4 b) {
 inline Floats4 rootOf(Floats4 a) {
     return {_mm512_sqrt_ps(a.f)};
 }
+inline Floats4 bitsAsFloats(Lanes4 longs) {
+    return {_mm512_castsi512_ps(longs.v)};
+}
 inline Floats4 floatsOf(Lanes4 longs) {
     return {_mm512_cvtepi32_ps(longs.v)};
 }

@@ -280,6 +280,10 @@ inline Floats1 operator/(Floats1 a, Floats1 b) {
 inline Floats1 rootOf(Floats1 a) {
     return {_mm_sqrt_ps(a.f)};
 }
+// The bits of longs as floats.
+inline Floats1 bitsAsFloats(Lanes1 longs) {
+    return {_mm_castsi128_ps(longs.v)};
+}
 inline Floats1 floatsOf(Lanes1 longs) {
     return {_mm_cvtepi32_ps(longs.v)};
 }

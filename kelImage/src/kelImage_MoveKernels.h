@@ -8,10 +8,7 @@
 
 namespace {
 
-// ---- Rows reversed: pixel x comes from width - 1 - x. Lines to be written are asked for ahead, as the processor does not expect
-// them of a walk that reads backwards; that is harmless behind the end.
-
-constexpr ptrdiff_t kAhead = 24 * 64;
+// ---- Rows reversed: pixel x comes from width - 1 - x.
 
 template <int N> constexpr Sixteen reversedPixels() {
     Sixteen order = {};
@@ -26,7 +23,6 @@ template <int N> constexpr Sixteen kReversed = reversedPixels<N>();
 template <class V, int N> void reverseBlocks(uint8_t* d, const uint8_t* s, ptrdiff_t& x, ptrdiff_t width) {
     constexpr ptrdiff_t pixels = N == 3 ? V::kThrees : V::kBytes / N, spare = N == 3;
     for (; x + pixels + spare <= width; x += pixels) {
-        __builtin_prefetch(d + N * x + kAhead, 1);
         const uint8_t* const from = s + N * (width - pixels - x);
         if constexpr (N == 3)
             storeThreesReversed(d + N * x, from, V());

@@ -15,8 +15,11 @@ constexpr float kLuma = 1.164f, kRedV = 1.793f, kGreenU = -0.213f, kGreenV = -0.
 template <int byte>
 constexpr Sixteen kByteOfLong = {{byte, -1, -1, -1, byte + 4, -1, -1, -1, byte + 8, -1, -1, -1, byte + 12, -1, -1, -1}};
 
+// That byte less a bias, exactly: as the last bits of 2^23, from which 2^23 and the bias are taken again.
 template <int byte, class V> typename V::Floats floatsOfByte(V pairs, float bias) {
-    return floatsOf(shuffle(pairs, V::every(kByteOfLong<byte>))) - V::floats(bias);
+    constexpr float base = 8388608;
+    constexpr int bitsOfBase = 0x4b000000;
+    return bitsAsFloats(shuffle(pairs, V::every(kByteOfLong<byte>)) | V::longs(bitsOfBase)) - V::floats(base + bias);
 }
 
 // Four pairs of pixels a lane, from U, Y0, V, Y1 in every long. A channel comes out as signed words, the first pixels of the
