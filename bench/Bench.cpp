@@ -1,5 +1,6 @@
 // Runs the lines under Google Benchmark, takes medians of process CPU time, and prints the table of ratios.
 #include "Bench.h"
+#include "Table.h"
 
 #include <algorithm>
 #include <benchmark/benchmark.h>
@@ -90,15 +91,11 @@ public:
     }
 };
 
-struct Row {
-    std::string operation, size, peer, differs;
-    double kel, best, bound;
-};
-
-std::vector<Row> evaluate(const std::map<std::string, std::vector<double>>& times) {
+// `avx2` and `sse41` are the ratios that other runs have measured, with the kernels of those.
+std::vector<Row> evaluate(const std::map<std::string, std::vector<double>>& times, const Ratios& avx2, const Ratios& sse41) {
     std::vector<Row> rows;
     for (const Line& line : lines()) {
-        Row row{line.operation, line.size, "-", "", NAN, NAN, NAN};
+        Row row{line.operation, line.size, "-", "", NAN, NAN, NAN, NAN, NAN};
         for (size_t i = 0; i < line.runs.size(); ++i) {
             const auto found = times.find(name(line, line.runs[i]));
             const double time = found == times.end() ? NAN : median(found->second);
@@ -112,80 +109,16 @@ std::vector<Row> evaluate(const std::map<std::string, std::vector<double>>& time
                 row.differs = line.runs[i].differs;
             }
         }
+        const auto ratioOf = [&](const Ratios& ratios) {
+            const auto found = ratios.find({line.operation, line.size});
+            return found == ratios.end() ? NAN : found->second;
+        };
+        row.avx2 = ratioOf(avx2);
+        row.sse41 = ratioOf(sse41);
         if (!std::isnan(row.kel))
             rows.push_back(row);
     }
     return rows;
-}
-
-std::string number(double value, const char* format) {
-    if (std::isnan(value))
-        return "-";
-    char text[32];
-    std::snprintf(text, sizeof text, format, value);
-    return text;
-}
-
-// Geometric mean of kel / best peer over the lines of one size, or of all where `size` is empty.
-double meanRatio(const std::vector<Row>& rows, const std::string& size) {
-    double sum = 0;
-    int count = 0;
-    for (const Row& row : rows)
-        if ((size.empty() || row.size == size) && !std::isnan(row.best)) {
-            sum += std::log(row.kel / row.best);
-            ++count;
-        }
-    return count ? std::exp(sum / count) : NAN;
-}
-
-std::string modelName() {
-    std::ifstream info("/proc/cpuinfo");
-    for (std::string line; std::getline(info, line);)
-        if (line.rfind("model name", 0) == 0)
-            return line.substr(line.find(':') + 2);
-    return "unknown processor";
-}
-
-std::string peers() {
-    std::string text;
-    const auto append = [&](const char* peer, bool present) {
-        text += (text.empty() ? "" : ", ") + std::string(peer) + (present ? "" : " (absent)");
-    };
-#if KEL_BENCH_OPENCV
-    append("OpenCV " CV_VERSION, true);
-#else
-    append("OpenCV", false);
-#endif
-    append("libyuv", KEL_BENCH_LIBYUV);
-    append("Eigen", KEL_BENCH_EIGEN);
-    append("LAPACK", KEL_BENCH_LAPACK);
-    return text;
-}
-
-std::string table(const std::vector<Row>& rows) {
-    std::ostringstream out;
-    out << modelName() << ", GCC " << __VERSION__ << ", one thread; medians of process CPU time in microseconds.\n"
-        << "Peers: " << peers()
-        << ". Ratio: kel / best peer, below 1 kel is faster. Bound: a plain pass over the same bytes.\n\n"
-        << "| operation | size | kel | best peer | ratio | to bound | the peer differs in |\n"
-        << "|---|---|---:|---:|---:|---:|---|\n";
-    for (const Row& row : rows)
-        out << "| " << row.operation << " | " << row.size << " | " << number(row.kel, "%.4g") << " | "
-            << (std::isnan(row.best) ? "-" : number(row.best, "%.4g") + " " + row.peer) << " | "
-            << number(row.kel / row.best, "%.2f") << " | " << number(row.kel / row.bound, "%.2f") << " | " << row.differs
-            << " |\n";
-    out << "\nGeometric mean of the ratios: " << number(meanRatio(rows, "1920x1080"), "%.2f") << " at 1920x1080, "
-        << number(meanRatio(rows, ""), "%.2f") << " over all lines.\n";
-    return out.str();
-}
-
-std::string csv(const std::vector<Row>& rows) {
-    std::ostringstream out;
-    out << "operation,size,kel_us,best_us,peer,ratio,bound_us,differs\n";
-    for (const Row& row : rows)
-        out << row.operation << ',' << row.size << ',' << row.kel << ',' << row.best << ',' << row.peer << ','
-            << row.kel / row.best << ',' << row.bound << ",\"" << row.differs << "\"\n";
-    return out.str();
 }
 
 bool save(const std::string& path, const std::string& text) {
@@ -236,19 +169,21 @@ ImagePointer image(int width, int height, int type) {
 
 } // namespace kel_bench
 
-// Options of Google Benchmark (--benchmark_filter=REGEX, ...), --table=FILE and --csv=FILE.
+// Options of Google Benchmark (--benchmark_filter=REGEX, ...), --table=FILE, --picture=FILE and --csv=FILE; and --avx2=FILE and
+// --sse41=FILE, which --csv has made of a run with the kernels of those instructions.
 int main(int argc, char** argv) {
     using namespace kel_bench;
-    std::string tablePath, csvPath;
+    std::map<std::string, std::string> path = {
+        {"--table=", ""}, {"--picture=", ""}, {"--csv=", ""}, {"--avx2=", ""}, {"--sse41=", ""}};
     std::vector<char*> arguments;
     char interleave[] = "--benchmark_enable_random_interleaving=true", repetitions[] = "--benchmark_repetitions=7",
          minTime[] = "--benchmark_min_time=0.01";
     for (int i = 0; i < argc; ++i) {
         const std::string argument = argv[i];
-        if (argument.rfind("--table=", 0) == 0)
-            tablePath = argument.substr(8);
-        else if (argument.rfind("--csv=", 0) == 0)
-            csvPath = argument.substr(6);
+        const size_t length = argument.find('=') + 1;
+        const auto option = path.find(argument.substr(0, length));
+        if (option != path.end())
+            option->second = argument.substr(length);
         else
             arguments.push_back(argv[i]);
         if (i == 0)
@@ -279,9 +214,13 @@ int main(int argc, char** argv) {
         std::cerr << "kel_bench: no benchmark has that name\n";
         return 1;
     }
-    const std::vector<Row> rows = evaluate(collector.times);
+    const std::vector<Row> rows = evaluate(collector.times, ratiosOf(path["--avx2="]), ratiosOf(path["--sse41="]));
     std::cout << table(rows);
-    const bool saved = (tablePath.empty() || save(tablePath, "# Performance\n\n" + table(rows))) &&
-                       (csvPath.empty() || save(csvPath, csv(rows)));
-    return saved ? 0 : 1;
+    const auto saved = [&](const char* option, const std::string& text) {
+        return path[option].empty() || save(path[option], text);
+    };
+    return saved("--table=", "# Performance\n\n![Every operation at 1920x1080](images/performance.svg)\n\n" + table(rows)) &&
+                   saved("--picture=", picture(rows)) && saved("--csv=", csv(rows))
+               ? 0
+               : 1;
 }
