@@ -16,7 +16,7 @@ kelValue_s32 wrappingMultiply(kelValue_s32 a, kelValue_s32 b) {
 }
 
 constexpr kelValue_s32 kAlignment = 16; // bytes of a vector, and pixels that `step` is a multiple of
-constexpr size_t kCacheLine = 64;       // what blocks start with, so that wide vectors do not straddle lines; nobody relies on it
+constexpr size_t kCacheLine = 64; // what blocks start with, so that wide vectors do not straddle lines; nobody relies on it
 
 void copyRows(unsigned char* dst, ptrdiff_t dstPitch, const unsigned char* src, ptrdiff_t srcPitch, size_t bytes,
               kelValue_s32 rows) {
