@@ -1,6 +1,7 @@
 # Installation: headers under include/kel, the library, a relocatable CMake package and a pkg-config file.
 install(TARGETS kel EXPORT kelTargets
-  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development)
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
+  ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT development)
 install(FILES ${kel_headers} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/kel COMPONENT development)
 
 set(kel_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/kel)
@@ -29,3 +30,26 @@ foreach(dir LIBDIR INCLUDEDIR)
 endforeach()
 configure_file(${PROJECT_SOURCE_DIR}/cmake/kel.pc.in ${PROJECT_BINARY_DIR}/kel.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/kel.pc DESTINATION ${kel_pc_dir} COMPONENT development)
+
+# The programs, under names that leave "register" and the like to others, with man pages from what they say of themselves.
+if(KEL_BUILD_EXAMPLES)
+  find_program(KEL_HELP2MAN help2man)
+  foreach(program IN LISTS kel_programs)
+    install(TARGETS ${program} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT tools)
+    install(CODE "set(bin \"\$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/${CMAKE_INSTALL_BINDIR}\")
+      file(RENAME \${bin}/${program} \${bin}/kel-${program})" COMPONENT tools)
+    if(KEL_HELP2MAN)
+      set(page ${PROJECT_BINARY_DIR}/man/kel-${program}.1)
+      add_custom_command(OUTPUT ${page} DEPENDS ${program}
+        COMMAND ${CMAKE_COMMAND} -E create_symlink $<TARGET_FILE:${program}> ${PROJECT_BINARY_DIR}/man/kel-${program}
+        COMMAND ${KEL_HELP2MAN} --no-info --section 1 "--name=${kel_${program}_does}" --output ${page}
+          ${PROJECT_BINARY_DIR}/man/kel-${program} VERBATIM)
+      list(APPEND kel_pages ${page})
+    endif()
+  endforeach()
+  if(KEL_HELP2MAN)
+    file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/man)
+    add_custom_target(kel_man ALL DEPENDS ${kel_pages})
+    install(FILES ${kel_pages} DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT tools)
+  endif()
+endif()

@@ -7,6 +7,7 @@
 #include <exception>
 #include <functional>
 #include <iostream>
+#include <kel/kelImage.h>
 #include <new>
 #include <sstream>
 #include <string>
@@ -31,6 +32,12 @@ inline CLI::Validator numberIn(double least, double most) {
 // Parses the options and runs `body`, whose result is the exit status.
 inline int runProgram(CLI::App& app, int argc, char** argv, const std::function<int()>& body) {
     prepareProcess();
+    std::string name = argc > 0 ? argv[0] : ""; // as it is called: installed programs have a name of their own
+    if (name.find('/') != std::string::npos)
+        name.erase(0, name.rfind('/') + 1);
+    if (!name.empty())
+        app.name(name);
+    app.set_version_flag("--version", app.get_name() + " (kel) " KEL_VERSION);
     app.failure_message([](const CLI::App* a, const CLI::Error& error) { return a->get_name() + ": " + error.what() + "\n"; });
     const auto complain = [&](const char* what) {
         showProgress("");

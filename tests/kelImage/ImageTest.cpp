@@ -1,4 +1,5 @@
 // Life cycle of images, load and store.
+#include <algorithm>
 #include <gtest/gtest.h>
 #include <malloc.h>
 
