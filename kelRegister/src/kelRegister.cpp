@@ -1,0 +1,162 @@
+// The calls of the interface: what they accept, the order of the stages, and the verdict.
+#include <algorithm>
+#include <cmath>
+
+#include "kelRegister_Private.h"
+
+namespace kelRegister {
+
+namespace {
+
+constexpr int kLeastPlaces = 12;                                          // that agree in the end
+constexpr double kLeastShare = 0.35;                                      // of the patches
+constexpr double kMostExpected = 2;                                       // pixels of the second picture
+constexpr double kMostRepeating = 0.5;                                    // of the agreeing patches
+constexpr double kViewMargin = 6;                                         // working pixels from the edge
+constexpr int kViewFeatures = 500;      // keypoints of a squeezed view
+constexpr double kSupportReach = 0.2;                                     // of the first picture's diagonal
+constexpr double kSupportSlack = 3;                                       // working pixels of the second
+constexpr int kLeastMatches = 5;                                          // to try a fit on
+
+std::string whyUnusable(const Options& options) {
+    if (!(options.threshold >= 0.1f && options.threshold <= 100))
+        return "the threshold is not between 0.1 and 100 pixels";
+    if (options.mostFeatures < 50 || options.mostFeatures > 5000)
+        return "the number of features is not between 50 and 5000";
+    if (options.workingSize < 200 || options.workingSize > 8000)
+        return "the working size is not between 200 and 8000 pixels";
+    return std::string();
+}
+
+std::string percent(double share) {
+    return std::to_string(static_cast<int>(100 * share)) + " %";
+}
+
+Point pointOf(const Feature& f) {
+    return {f.x, f.y};
+}
+
+// Both pictures on their way through the stages.
+class Registration {
+public:
+    Registration(const kelImage_t* first, const kelImage_t* second, const Options& options, Result& result)
+        : m_options(options), m_result(result), m_first(makePyramid(greyOf(first), options.workingSize)),
+          m_second(makePyramid(greyOf(second), options.workingSize)) {}
+
+    void run() {
+        m_result.first = findFeatures(m_first, m_options.mostFeatures);
+        m_result.second = findFeatures(m_second, m_options.mostFeatures);
+        if (!attempt() && m_options.views) {
+            addViews(m_first, m_result.first);
+            addViews(m_second, m_result.second);
+            attempt();
+        }
+    }
+
+private:
+    void addViews(const Pyramid& picture, std::vector<Feature>& features) const {
+        for (int eighths = 0; eighths < kViews; ++eighths) {
+            const View view = makeView(picture, eighths);
+            for (Feature f : findFeatures(view.pyramid, std::min(kViewFeatures, m_options.mostFeatures))) {
+                const Point place = view.toPicture.at(pointOf(f));
+                f.x = static_cast<float>(place.x);
+                f.y = static_cast<float>(place.y);
+                f.angle += static_cast<float>(view.turned);
+                f.squeeze = 2;
+                f.direction = static_cast<float>(view.direction);
+                const double margin = kViewMargin * picture.workingScale; // turned views end in the picture's edge
+                if (place.x >= margin && place.y >= margin && place.x < picture.width - margin &&
+                    place.y < picture.height - margin)
+                    features.push_back(f);
+            }
+        }
+    }
+
+    Bound bound() const { return {m_options.threshold * m_first.workingScale, m_options.threshold * m_second.workingScale}; }
+
+    bool refuse(const std::string& reason) {
+        m_result.reason = reason;
+        return false;
+    }
+
+    // Matching to verdict with the features that there are.
+    bool attempt() {
+        Result& r = m_result;
+        r.matches = matchFeatures(r.first, r.second);
+        const double diagonal = std::hypot(m_first.width, m_first.height);
+        const std::vector<bool> marks =
+            supported(r.first, r.second, r.matches, kSupportReach * diagonal, kSupportSlack * m_second.workingScale);
+        std::vector<Pair> all, some;
+        for (size_t i = 0; i < r.matches.size(); ++i) {
+            all.push_back({pointOf(r.first[r.matches[i].first]), pointOf(r.second[r.matches[i].second])});
+            if (marks[i])
+                some.push_back(all.back());
+        }
+        if (static_cast<int>(some.size()) < kLeastMatches)
+            return refuse("only " + std::to_string(some.size()) + " matches that support each other of " +
+                          std::to_string(r.matches.size()));
+        Map H;
+        if (!fitRobustly(some, all, bound(), H))
+            return refuse("no plausible homography among " + std::to_string(some.size()) + " matches");
+        const Judgement judgement = refine(m_first, m_second, r.first, r.second, std::min(m_options.threshold, 3.0f), H);
+        r.tested = judgement.tested;
+        r.agreeing = judgement.agreeing;
+        r.share = static_cast<float>(judgement.share());
+        if (judgement.places < kLeastPlaces)
+            return refuse("the pictures agree at only " + std::to_string(judgement.places) + " places");
+        if (judgement.share() < kLeastShare)
+            return refuse("the pictures agree in only " + percent(judgement.share()) + " of the patches compared");
+        if (judgement.repeating > kMostRepeating)
+            return refuse("the pictures repeat themselves: " + percent(judgement.repeating) +
+                          " of the patches fit many other places as well");
+        const double error = expectedError(H, judgement.pairs, m_first, m_second);
+        r.expectedError = static_cast<float>(error);
+        if (!(error <= kMostExpected))
+            return refuse("the places that agree lie too close together to tell of the whole");
+        accept(H, all);
+        return true;
+    }
+
+    void accept(const Map& H, const std::vector<Pair>& all) {
+        Result& r = m_result;
+        r.found = true;
+        r.reason.clear();
+        r.H.create(3, 3, false);
+        for (int i = 0; i < 9; ++i)
+            r.H.m_Data[i] = static_cast<float>(H.m[i] / H.m[8]);
+        const std::vector<bool> marks = agreeing(H, all, bound());
+        for (size_t i = 0; i < all.size(); ++i)
+            r.matches[i].inlier = marks[i];
+    }
+
+    const Options& m_options;
+    Result& m_result;
+    const Pyramid m_first, m_second;
+};
+
+} // namespace
+
+std::vector<Feature> findFeatures(const kelImage_t* picture, const Options& options, std::string* reason) {
+    std::string why = whyUnusable(options);
+    if (why.empty())
+        why = whyUnusable(picture, "given");
+    if (why.empty())
+        return findFeatures(makePyramid(greyOf(picture), options.workingSize), options.mostFeatures);
+    if (reason)
+        *reason = why;
+    return std::vector<Feature>();
+}
+
+Result registerPictures(const kelImage_t* first, const kelImage_t* second, const Options& options) {
+    Result result;
+    result.reason = whyUnusable(options);
+    if (result.reason.empty())
+        result.reason = whyUnusable(first, "first");
+    if (result.reason.empty())
+        result.reason = whyUnusable(second, "second");
+    if (result.reason.empty())
+        Registration(first, second, options, result).run();
+    return result;
+}
+
+} // namespace kelRegister

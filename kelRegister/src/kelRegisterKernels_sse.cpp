@@ -1,0 +1,6 @@
+// The kernels for every processor: SSE4.1.
+#include "kelRegisterKernelBodies.h"
+
+namespace kelRegister {
+const Kernels kKernelsSse = {gradients, describe, differences, correlate};
+}

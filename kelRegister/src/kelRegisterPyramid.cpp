@@ -1,0 +1,128 @@
+// Levels of a picture: halved until it is of working size, then two chains of halves, the second reduced by the root of 2 first; and
+// squeezed views. Smoothing, halving and responses are libkel's.
+#include <algorithm>
+#include <cmath>
+
+#include "kelRegister_Private.h"
+
+namespace kelRegister {
+
+namespace {
+
+constexpr int kSmallestLevel = 40; // pixels on the shorter side
+constexpr int kMostOctaves = 4;
+
+// The level of `image`; where `next` is not null, also the image for the one half as large, whose pixels are every second of this.
+Level makeLevel(const Image& image, double scale, double offset, bool withCross, Image* next) {
+    const int width = image->width + 2 * kBorder, height = image->height + 2 * kBorder;
+    Level level{create(width, height, KEL_PIXEL_TYPE_U8G), Image(), scale, offset};
+    const Image scratch = create(width, height, KEL_PIXEL_TYPE_U8G);
+    Image half;
+    if (next)
+        half = create((width + 1) / 2, (height + 1) / 2, KEL_PIXEL_TYPE_U8G);
+    resizeKelImageEnborder(level.smooth.get(), image.get(), kBorder);
+    applyKelFilterGaussian7X7_downsampling(level.smooth.get(), half.get(), level.smooth.get(), scratch.get());
+    if (withCross) {
+        level.cross = create(width, height, KEL_PIXEL_TYPE_S16G);
+        applyKelFilterLaplacian3X3(level.cross.get(), level.smooth.get());
+    }
+    if (next) {
+        *next = create(half->width - kBorder, half->height - kBorder, KEL_PIXEL_TYPE_U8G);
+        resizeKelImageDeborder(next->get(), half.get(), kBorder / 2);
+    }
+    return level;
+}
+
+void addChain(std::vector<Level>& levels, Image image, double scale, double offset) {
+    for (int octave = 0; octave < kMostOctaves && std::min(image->width, image->height) >= kSmallestLevel; ++octave) {
+        Image next;
+        levels.push_back(makeLevel(image, scale, offset, true, &next));
+        image = std::move(next);
+        scale *= 2;
+    }
+}
+
+// Both chains from an image of working size.
+void addChains(Pyramid& pyramid, Image image) {
+    const double scale = pyramid.workingScale, root = std::sqrt(2.0);
+    const int width = static_cast<int>(image->width / root), height = static_cast<int>(image->height / root);
+    pyramid.firstWorking = pyramid.levels.size();
+    addChain(pyramid.levels, std::move(image), scale, 0);
+    if (pyramid.levels.size() == pyramid.firstWorking)
+        return;
+    Image between = create(width, height, KEL_PIXEL_TYPE_U8G);
+    const float r = static_cast<float>(root);
+    rotateKelImageHomography(between.get(), pyramid.levels[pyramid.firstWorking].smooth.get(), r, 0, kBorder, 0, r, kBorder, 0,
+                             0, 1);
+    // Pixel centres map to pixel centres at p * root + (root - 1) / 2; halving keeps even pixels, and so the offset.
+    addChain(pyramid.levels, std::move(between), scale * root, scale * (root - 1) / 2);
+}
+
+} // namespace
+
+Pyramid makePyramid(Image grey, int workingSize) {
+    Pyramid pyramid;
+    pyramid.width = grey->width;
+    pyramid.height = grey->height;
+    pyramid.workingScale = 1;
+    while (std::max(grey->width, grey->height) > workingSize && std::min(grey->width, grey->height) >= 2 * kSmallestLevel) {
+        Image next;
+        pyramid.levels.push_back(makeLevel(grey, pyramid.workingScale, 0, false, &next));
+        grey = std::move(next);
+        pyramid.workingScale *= 2;
+    }
+    pyramid.working = Image(cloneKelImage(grey.get()));
+    if (!pyramid.working || !pyramid.working->data)
+        throw std::bad_alloc();
+    addChains(pyramid, std::move(grey));
+    return pyramid;
+}
+
+// Means of two neighbours along x or y; the other axis keeps its sharpness.
+static Image squeezedAlongAxis(const kelImage_t* from, bool alongX) {
+    Image image = create(alongX ? from->width / 2 : from->width, alongX ? from->height : from->height / 2, KEL_PIXEL_TYPE_U8G);
+    for (int y = 0; y < image->height; ++y) {
+        uint8_t* const to = rowOf(image.get(), y);
+        const uint8_t* const a = rowOf(from, alongX ? y : 2 * y);
+        const uint8_t* const b = alongX ? a + 1 : a + from->step;
+        for (int x = 0; x < image->width; ++x)
+            to[x] = static_cast<uint8_t>((a[alongX ? 2 * x : x] + b[alongX ? 2 * x : x] + 1) / 2);
+    }
+    return image;
+}
+
+View makeView(const Pyramid& picture, int eighths) {
+    const double scale = picture.workingScale, root = std::sqrt(0.5);
+    const kelImage_t* const from = picture.working.get();
+    View view;
+    view.direction = eighths * 3.14159265358979 / 4;
+    view.pyramid.workingScale = scale;
+    Image image;
+    if (eighths % 2 == 0) {
+        const bool alongX = eighths == 0;
+        image = squeezedAlongAxis(from, alongX);
+        view.turned = 0;
+        view.toPicture = alongX ? Map{{2, 0, scale / 2, 0, 1, 0, 0, 0, 1}} : Map{{1, 0, 0, 0, 2, scale / 2, 0, 0, 1}};
+    } else { // turned, so that the squeeze is along the view's x axis, about the middle
+        const double side = root * (from->width + from->height), c = eighths == 1 ? root : -root, s = root;
+        image = create(static_cast<int>(side / 2), static_cast<int>(side), KEL_PIXEL_TYPE_U8G);
+        const double x = (from->width - 1) / 2.0 - c * side / 2 + s * side / 2;
+        const double y = (from->height - 1) / 2.0 - s * side / 2 - c * side / 2;
+        const Map working = {{2 * c, -s, x, 2 * s, c, y, 0, 0, 1}};
+        // The library goes from pixel centres at halves to the squares that hold them; levels have a border.
+        const Map centres =
+            Map{{1, 0, kBorder + 0.5, 0, 1, kBorder + 0.5, 0, 0, 1}} * working * Map{{1, 0, -0.5, 0, 1, -0.5, 0, 0, 1}};
+        float h[9];
+        std::copy_n(centres.m, 9, h);
+        rotateKelImageHomography(image.get(), picture.levels[picture.firstWorking].smooth.get(), h[0], h[1], h[2], h[3], h[4],
+                                 h[5], h[6], h[7], h[8]);
+        view.turned = view.direction;
+        view.toPicture = {{working.m[0], working.m[1], scale * x, working.m[3], working.m[4], scale * y, 0, 0, 1}};
+    }
+    view.pyramid.width = static_cast<int>(image->width * scale);
+    view.pyramid.height = static_cast<int>(image->height * scale);
+    addChains(view.pyramid, std::move(image));
+    return view;
+}
+
+} // namespace kelRegister
