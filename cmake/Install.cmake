@@ -1,11 +1,19 @@
-# Installation: headers under include/kel, the library, a relocatable CMake package and a pkg-config file.
+# Installation: headers under include/kel, the libraries, a relocatable CMake package and pkg-config files. Registration has components
+# of its own, which may be left out.
 install(TARGETS kel EXPORT kelTargets
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT runtime NAMELINK_COMPONENT development
   ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT development)
 install(FILES ${kel_headers} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/kel COMPONENT development)
 
+install(TARGETS kelRegister EXPORT kelRegisterTargets
+  LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT register_runtime NAMELINK_COMPONENT register_development
+  ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT register_development)
+install(FILES ${kelRegister_headers} DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}/kel COMPONENT register_development)
+
 set(kel_package_dir ${CMAKE_INSTALL_LIBDIR}/cmake/kel)
 install(EXPORT kelTargets NAMESPACE kel:: FILE kelTargets.cmake DESTINATION ${kel_package_dir} COMPONENT development)
+install(EXPORT kelRegisterTargets NAMESPACE kel:: FILE kelRegisterTargets.cmake DESTINATION ${kel_package_dir}
+  COMPONENT register_development)
 configure_package_config_file(${PROJECT_SOURCE_DIR}/cmake/kelConfig.cmake.in ${PROJECT_BINARY_DIR}/kelConfig.cmake
   INSTALL_DESTINATION ${kel_package_dir})
 write_basic_package_version_file(${PROJECT_BINARY_DIR}/kelConfigVersion.cmake COMPATIBILITY SameMajorVersion)
@@ -30,6 +38,8 @@ foreach(dir LIBDIR INCLUDEDIR)
 endforeach()
 configure_file(${PROJECT_SOURCE_DIR}/cmake/kel.pc.in ${PROJECT_BINARY_DIR}/kel.pc @ONLY)
 install(FILES ${PROJECT_BINARY_DIR}/kel.pc DESTINATION ${kel_pc_dir} COMPONENT development)
+configure_file(${PROJECT_SOURCE_DIR}/cmake/kelregister.pc.in ${PROJECT_BINARY_DIR}/kelregister.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/kelregister.pc DESTINATION ${kel_pc_dir} COMPONENT register_development)
 
 # The programs, under names that leave "register" and the like to others, with man pages from what they say of themselves.
 if(KEL_BUILD_EXAMPLES)

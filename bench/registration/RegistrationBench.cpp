@@ -21,50 +21,26 @@
 
 #include "common/Picture.h"
 #include "common/Scene.h"
+#include "support/Warps.h"
 
 using namespace kel_examples;
+using namespace kel_test;
 
 namespace {
 
+constexpr int kMostPixels = 1000;        // of a warped picture, either way
 constexpr double kFound = 5, kWrong = 6; // mean error in pixels: below the one found, from the other on wrong
-
-struct View {
-    std::string name;
-    Image picture; // U8G
-};
-
-using Matrix = cv::Matx33d;
-
-cv::Point2d at(const Matrix& H, double x, double y) {
-    const cv::Vec3d p = H * cv::Vec3d(x, y, 1);
-    return {p[0] / p[2], p[1] / p[2]};
-}
 
 struct Case {
     std::string kind, name;
     const kelImage_t *first, *second;
-    Matrix truth; // of pictures that belong together
+    Plane truth; // of pictures that belong together
     bool belongs;
 };
 
-// Mean distance between where the two take a grid of points of the first picture that fall into the second one.
-double meanError(const Matrix& H, const Case& c) {
-    double sum = 0;
-    int count = 0;
-    for (int y = 0; y < c.first->height; y += 8)
-        for (int x = 0; x < c.first->width; x += 8) {
-            const cv::Point2d to = at(c.truth, x, y), is = at(H, x, y);
-            if (to.x < 0 || to.y < 0 || to.x >= c.second->width || to.y >= c.second->height)
-                continue;
-            sum += std::min(1000.0, std::hypot(is.x - to.x, is.y - to.y));
-            ++count;
-        }
-    return count ? sum / count : 0;
-}
-
 struct Answer {
     bool found;
-    Matrix H;
+    Plane H;
     double share;
     std::string reason;
 };
@@ -73,9 +49,9 @@ using Method = std::function<Answer(const Case&)>;
 
 Answer byKel(const Case& c) {
     const kelRegister::Result r = kelRegister::registerPictures(c.first, c.second);
-    Answer answer = {r.found, Matrix::eye(), r.share, r.reason};
+    Answer answer = {r.found, Plane::scale(1, 1), r.share, r.reason};
     if (r.found)
-        std::copy_n(r.H.m_Data, 9, answer.H.val);
+        std::copy_n(r.H.m_Data, 9, answer.H.m);
     return answer;
 }
 
@@ -89,7 +65,7 @@ Answer byChain(const cv::Ptr<cv::Feature2D>& detector, int norm, const Case& c) 
     cv::Mat ofFirst, ofSecond;
     detector->detectAndCompute(matOf(c.first), cv::noArray(), first, ofFirst);
     detector->detectAndCompute(matOf(c.second), cv::noArray(), second, ofSecond);
-    Answer answer = {false, Matrix::eye(), 0, ""};
+    Answer answer = {false, Plane::scale(1, 1), 0, ""};
     if (first.size() < 2 || second.size() < 2)
         return answer;
     std::vector<std::vector<cv::DMatch>> matches;
@@ -107,62 +83,11 @@ Answer byChain(const cv::Ptr<cv::Feature2D>& detector, int norm, const Case& c) 
     if (H.empty() || cv::countNonZero(inliers) < 12)
         return answer;
     answer.found = true;
-    answer.H = Matrix(H);
+    std::copy_n(H.ptr<double>(), 9, answer.H.m);
     return answer;
 }
 
 // ---- cases ------------------------------------------------------------------------------------------------------------------
-
-// A picture as seen through a map, every pixel the mean of 4 x 4 samples between the picture's pixels; 0 outside.
-Image rendered(const kelImage_t* picture, const Matrix& H, int width, int height) {
-    constexpr int kSamples = 4;
-    const Matrix back = H.inv();
-    Image result = create(width, height, KEL_PIXEL_TYPE_U8G);
-    clearKelImage(result.get());
-    for (int y = 0; y < height; ++y)
-        for (int x = 0; x < width; ++x) {
-            double sum = 0;
-            for (int k = 0; k < kSamples * kSamples; ++k) {
-                const cv::Point2d p =
-                    at(back, x + (k % kSamples + 0.5) / kSamples - 0.5, y + (k / kSamples + 0.5) / kSamples - 0.5);
-                const int ix = static_cast<int>(std::floor(p.x)), iy = static_cast<int>(std::floor(p.y));
-                if (ix < 0 || iy < 0 || ix >= picture->width - 1 || iy >= picture->height - 1)
-                    continue;
-                const uint8_t* const q = picture->data + static_cast<ptrdiff_t>(iy) * picture->step + ix;
-                const double fx = p.x - ix, fy = p.y - iy;
-                sum += (1 - fy) * (q[0] + fx * (q[1] - q[0])) +
-                       fy * (q[picture->step] + fx * (q[picture->step + 1] - q[picture->step]));
-            }
-            result->data[static_cast<ptrdiff_t>(y) * result->step + x] =
-                static_cast<uint8_t>(sum / (kSamples * kSamples) + 0.5);
-        }
-    return result;
-}
-
-Matrix turn(double degrees) {
-    const double a = degrees * CV_PI / 180;
-    return {std::cos(a), -std::sin(a), 0, std::sin(a), std::cos(a), 0, 0, 0, 1};
-}
-
-// Tilted in a direction, turned and scaled about the picture's middle, and moved so that all of it is to be seen.
-Image warped(const kelImage_t* picture, double tilt, double direction, double turned, double scale, Matrix& H) {
-    const Matrix shape =
-        Matrix(scale, 0, 0, 0, scale, 0, 0, 0, 1) * turn(turned) * Matrix(1 / tilt, 0, 0, 0, 1, 0, 0, 0, 1) * turn(direction);
-    double left = 1e9, top = 1e9, right = -1e9, bottom = -1e9;
-    for (const double x : {0.0, picture->width - 1.0})
-        for (const double y : {0.0, picture->height - 1.0}) {
-            const cv::Point2d p = at(shape, x, y);
-            left = std::min(left, p.x);
-            top = std::min(top, p.y);
-            right = std::max(right, p.x);
-            bottom = std::max(bottom, p.y);
-        }
-    const int width = std::min(1000, static_cast<int>(right - left) + 2),
-              height = std::min(1000, static_cast<int>(bottom - top) + 2);
-    const double cx = (left + right - width) / 2, cy = (top + bottom - height) / 2;
-    H = Matrix(1, 0, -cx - 0.3, 0, 1, -cy + 0.4, 0, 0, 1) * shape;
-    return rendered(picture, H, width, height);
-}
 
 class Cases {
 public:
@@ -174,9 +99,9 @@ public:
     const std::vector<std::pair<std::string, const kelImage_t*>>& bases() const { return m_bases; }
     void addBase(const std::string& name, const kelImage_t* image) { m_bases.emplace_back(name, image); }
     void both(const std::string& kind, const std::string& name, const kelImage_t* first, const kelImage_t* second,
-              const Matrix& H) {
+              const Plane& H) {
         all.push_back({kind, name, first, second, H, true});
-        all.push_back({kind, name + " back", second, first, H.inv(), true});
+        all.push_back({kind, name + " back", second, first, H.inverse(), true});
     }
 
 private:
@@ -201,9 +126,9 @@ void addPairs(Cases& cases, const std::string& folder) {
     for (const std::filesystem::path& file : files) {
         const std::string stem = file.stem().string();
         const size_t middle = stem.find("_to_");
-        Matrix H;
+        Plane H;
         std::ifstream stream(file);
-        for (double& value : H.val)
+        for (double& value : H.m)
             if (!(stream >> value))
                 throw Error(file.string() + ": does not hold nine numbers");
         const std::string a = stem.substr(0, middle), b = stem.substr(middle + 4);
@@ -226,11 +151,11 @@ void addWarps(Cases& cases, int each) {
     const auto between = [&](double lo, double hi) { return lo + (hi - lo) * (numbers() % 65536) / 65535.0; };
     const auto add = [&](const std::string& kind, const std::pair<std::string, const kelImage_t*>& base, double tilt,
                          double direction, double turned, double scale) {
-        Matrix H;
+        Plane H;
         char name[100];
         std::snprintf(name, sizeof name, "%s tilt %.2f by %.0f turn %.0f scale %.2f", base.first.c_str(), tilt, direction,
                       turned, scale);
-        const kelImage_t* const image = cases.keep(warped(base.second, tilt, direction, turned, scale, H));
+        const kelImage_t* const image = cases.keep(warped(base.second, {tilt, direction, turned, scale}, kMostPixels, H));
         cases.both(kind, name, base.second, image, H);
     };
     for (const auto& base : cases.bases())
@@ -253,8 +178,9 @@ void addHarder(Cases& cases, int each) {
     const std::vector<Case> plain = cases.all;
     for (const Case& c : plain)
         for (int i = 0; i < each && c.kind == "photographs"; ++i) {
-            Matrix H;
-            Image image = warped(c.second, between(1, 1.6), between(0, 180), between(-180, 180), between(0.6, 1.3), H);
+            Plane H;
+            Image image =
+                warped(c.second, {between(1, 1.6), between(0, 180), between(-180, 180), between(0.6, 1.3)}, kMostPixels, H);
             cv::Mat view = matOf(image.get());
             cv::Mat(view).copyTo(view);
             const double gamma = between(0.5, 2), gain = between(0.5, 1.1), noise = between(0, 8);
@@ -271,7 +197,7 @@ void addHarder(Cases& cases, int each) {
             const kelImage_t* const kept = cases.keep(greyOf(image));
             cases.all.push_back({"harder", c.name + " " + std::to_string(i), c.first, kept, H * c.truth, true});
             cases.all.push_back(
-                {"harder", c.name + " " + std::to_string(i) + " back", kept, c.first, (H * c.truth).inv(), true});
+                {"harder", c.name + " " + std::to_string(i) + " back", kept, c.first, (H * c.truth).inverse(), true});
         }
 }
 
@@ -279,8 +205,8 @@ void addHarder(Cases& cases, int each) {
 void addBlurred(Cases& cases) {
     for (const auto& base : cases.bases())
         for (const double sigma : {2.0, 3.0, 4.0, 5.0, 6.0}) {
-            Matrix H;
-            Image image = warped(base.second, 1.1, 20, 10 * sigma, 0.9, H);
+            Plane H;
+            Image image = warped(base.second, {1.1, 20, 10 * sigma, 0.9}, kMostPixels, H);
             cv::Mat view = matOf(image.get());
             cv::GaussianBlur(view, view, cv::Size(), sigma);
             cases.both("blurred", base.first + " by " + std::to_string(sigma), base.second, cases.keep(greyOf(image)), H);
@@ -291,7 +217,7 @@ void addBlurred(Cases& cases) {
 void addTextures(Cases& cases, std::vector<std::pair<std::string, const kelImage_t*>>& strangers) {
     std::mt19937 numbers(3);
     const auto texture = [&](const char* name, const std::function<int(int, int)>& value) {
-        Image image = create(640, 480, KEL_PIXEL_TYPE_U8G);
+        Image image(640, 480, KEL_PIXEL_TYPE_U8G);
         for (int y = 0; y < 480; ++y)
             for (int x = 0; x < image->step; ++x)
                 image->data[y * image->step + x] = static_cast<uint8_t>(value(x, y));
@@ -316,15 +242,17 @@ void addStrangers(Cases& cases, int most) {
     addTextures(cases, strangers);
     std::mt19937 numbers(5);
     for (const auto& base : cases.bases()) {
-        Matrix H;
-        strangers.emplace_back(base.first, cases.keep(warped(base.second, 1 + numbers() % 3 * 0.5, numbers() % 180,
-                                                             numbers() % 360, 0.5 + 0.25 * (numbers() % 4), H)));
+        Plane H;
+        strangers.emplace_back(base.first, cases.keep(warped(base.second,
+                                                             {1 + numbers() % 3 * 0.5, 1.0 * (numbers() % 180),
+                                                              1.0 * (numbers() % 360), 0.5 + 0.25 * (numbers() % 4)},
+                                                             kMostPixels, H)));
     }
     std::vector<Case> pairs;
     for (const auto& a : strangers)
         for (const auto& b : strangers)
             if (a.first != b.first)
-                pairs.push_back({"strangers", a.first + " and " + b.first, a.second, b.second, Matrix::eye(), false});
+                pairs.push_back({"strangers", a.first + " and " + b.first, a.second, b.second, Plane::scale(1, 1), false});
     std::shuffle(pairs.begin(), pairs.end(), numbers);
     pairs.resize(std::min(pairs.size(), static_cast<size_t>(most)));
     cases.all.insert(cases.all.end(), pairs.begin(), pairs.end());
@@ -366,7 +294,7 @@ void measure(const char* name, const Method& method, const Cases& cases, const s
             const double begin = processorTime();
             const Answer answer = method(c);
             const double time = processorTime() - begin;
-            const double error = !answer.found ? -1 : c.belongs ? meanError(answer.H, c) : 1000;
+            const double error = !answer.found ? -1 : c.belongs ? meanError(answer.H, c.truth, c.first, c.second) : 1000;
             ++row.pairs;
             row.milliseconds.push_back(time);
             row.refused += !answer.found;

@@ -8,15 +8,15 @@ namespace kelRegister {
 
 namespace {
 
-constexpr int kLeastPlaces = 12;                                          // that agree in the end
-constexpr double kLeastShare = 0.35;                                      // of the patches
-constexpr double kMostExpected = 2;                                       // pixels of the second picture
-constexpr double kMostRepeating = 0.5;                                    // of the agreeing patches
-constexpr double kViewMargin = 6;                                         // working pixels from the edge
-constexpr int kViewFeatures = 500;      // keypoints of a squeezed view
-constexpr double kSupportReach = 0.2;                                     // of the first picture's diagonal
-constexpr double kSupportSlack = 3;                                       // working pixels of the second
-constexpr int kLeastMatches = 5;                                          // to try a fit on
+constexpr int kLeastPlaces = 12;       // that agree in the end
+constexpr double kLeastShare = 0.35;   // of the patches
+constexpr double kMostExpected = 2;    // pixels of the second picture
+constexpr double kMostRepeating = 0.5; // of the agreeing patches
+constexpr double kViewMargin = 6;      // working pixels from the edge
+constexpr int kViewFeatures = 500;     // keypoints of a squeezed view
+constexpr double kSupportReach = 0.2;  // of the first picture's diagonal
+constexpr double kSupportSlack = 3;    // working pixels of the second
+constexpr int kLeastMatches = 5;       // to try a fit on
 
 std::string whyUnusable(const Options& options) {
     if (!(options.threshold >= 0.1f && options.threshold <= 100))

@@ -21,7 +21,7 @@ std::vector<Candidate> detect(const Pyramid& pyramid) {
         const Level& level = pyramid.levels[i];
         points.resize(static_cast<size_t>(level.smooth->width) * level.smooth->height / 16);
         const int count = applyKelDetectorKeypointYape(points.data(), static_cast<kelValue_s32>(points.size()),
-                                                       level.smooth.get(), level.cross.get());
+                                                       toRead(level.smooth), toRead(level.cross));
         for (int k = 0; k < count; ++k) {
             const float x = points[k].x - kBorder, y = points[k].y - kBorder;
             if (x >= 2 && y >= 2 && x <= static_cast<float>(level.width() - 3) && y <= static_cast<float>(level.height() - 3))

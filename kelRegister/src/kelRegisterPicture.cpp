@@ -12,15 +12,15 @@ constexpr int kLeastSide = 40, kMostSide = 32767;
 constexpr double kMostPixels = 134217728; // so that no intermediate picture reaches 2^31 bytes
 
 // Each row's padding repeats its last pixel: contrast stretching takes the padding in.
-void fillPadding(const Image& grey) {
+void fillPadding(Image& grey) {
     for (int y = 0; y < grey->height; ++y) {
-        uint8_t* const row = rowOf(grey.get(), y);
+        uint8_t* const row = grey.row(y);
         std::memset(row + grey->width, row[grey->width - 1], static_cast<size_t>(grey->step - grey->width));
     }
 }
 
 // 16-bit values spread linearly from their least to their greatest.
-void spread(const Image& grey, const kelImage_t* picture) {
+void spread(Image& grey, const kelImage_t* picture) {
     const auto row = [picture](int y) { return reinterpret_cast<const int16_t*>(rowOf(picture, y)); };
     int least = INT16_MAX, greatest = INT16_MIN;
     for (int y = 0; y < picture->height; ++y)
@@ -31,7 +31,7 @@ void spread(const Image& grey, const kelImage_t* picture) {
     const int extent = std::max(1, greatest - least);
     for (int y = 0; y < picture->height; ++y)
         for (int x = 0; x < picture->width; ++x)
-            rowOf(grey.get(), y)[x] = static_cast<uint8_t>((255 * (row(y)[x] - least) + extent / 2) / extent);
+            grey.row(y)[x] = static_cast<uint8_t>((255 * (row(y)[x] - least) + extent / 2) / extent);
 }
 
 } // namespace
@@ -66,7 +66,7 @@ Image greyOf(const kelImage_t* picture) {
     if (picture->type == KEL_PIXEL_TYPE_S16G) {
         spread(grey, picture);
     } else if (picture->channels == 4) { // straight to grey would write three times as much
-        const Image colours = create(picture->width, picture->height, KEL_PIXEL_TYPE_U8XYZ);
+        Image colours = create(picture->width, picture->height, KEL_PIXEL_TYPE_U8XYZ);
         convertKelImage_U8XYZA_to_U8XYZ(colours.get(), picture);
         convertKelImage(grey.get(), colours.get());
     } else if (picture->type == KEL_PIXEL_TYPE_U8G) {

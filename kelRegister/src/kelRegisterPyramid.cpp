@@ -16,7 +16,7 @@ constexpr int kMostOctaves = 4;
 Level makeLevel(const Image& image, double scale, double offset, bool withCross, Image* next) {
     const int width = image->width + 2 * kBorder, height = image->height + 2 * kBorder;
     Level level{create(width, height, KEL_PIXEL_TYPE_U8G), Image(), scale, offset};
-    const Image scratch = create(width, height, KEL_PIXEL_TYPE_U8G);
+    Image scratch = create(width, height, KEL_PIXEL_TYPE_U8G);
     Image half;
     if (next)
         half = create((width + 1) / 2, (height + 1) / 2, KEL_PIXEL_TYPE_U8G);
@@ -71,9 +71,7 @@ Pyramid makePyramid(Image grey, int workingSize) {
         grey = std::move(next);
         pyramid.workingScale *= 2;
     }
-    pyramid.working = Image(cloneKelImage(grey.get()));
-    if (!pyramid.working || !pyramid.working->data)
-        throw std::bad_alloc();
+    pyramid.working = grey.clone();
     addChains(pyramid, std::move(grey));
     return pyramid;
 }
@@ -82,7 +80,7 @@ Pyramid makePyramid(Image grey, int workingSize) {
 static Image squeezedAlongAxis(const kelImage_t* from, bool alongX) {
     Image image = create(alongX ? from->width / 2 : from->width, alongX ? from->height : from->height / 2, KEL_PIXEL_TYPE_U8G);
     for (int y = 0; y < image->height; ++y) {
-        uint8_t* const to = rowOf(image.get(), y);
+        uint8_t* const to = image.row(y);
         const uint8_t* const a = rowOf(from, alongX ? y : 2 * y);
         const uint8_t* const b = alongX ? a + 1 : a + from->step;
         for (int x = 0; x < image->width; ++x)

@@ -1,30 +1,29 @@
-// What the stages share: images that release themselves, plane maps in double precision, and the levels of a picture.
+// What the stages share: images, plane maps in double precision, and the levels of a picture.
 #ifndef KEL_REGISTER_PRIVATE_H
 #define KEL_REGISTER_PRIVATE_H
 
 #include <cstddef>
 #include <cstdint>
-#include <memory>
-#include <new>
 #include <string>
 #include <vector>
 
+#include <kel/kelImage.hpp>
 #include <kel/kelRegister.h>
 
 namespace kelRegister {
 
-struct Release {
-    void operator()(kelImage_t* image) const { releaseKelImage(&image); }
-};
-using Image = std::unique_ptr<kelImage_t, Release>;
+using kel::Image;
 
 // A new image of zeros, padding included: no stage reads what nobody wrote.
 inline Image create(int width, int height, int type) {
-    Image image(createKelImage(width, height, type));
-    if (!image || !image->data)
-        throw std::bad_alloc();
+    Image image(width, height, type);
     clearKelImage(image.get());
     return image;
+}
+
+// For libkel's functions that only read a source but do not say so.
+inline kelImage_t* toRead(const Image& image) {
+    return const_cast<kelImage_t*>(image.get());
 }
 
 inline uint8_t* rowOf(const kelImage_t* image, int y) {

@@ -1,14 +1,17 @@
 // Every operation of the lists from eight threads at once, each on objects of its own: results equal those of one thread, and the
 // thread sanitizer has something to look at.
 #include <algorithm>
+#include <array>
 #include <cstring>
 #include <gtest/gtest.h>
+#include <kel/kelRegister.h>
 #include <thread>
 #include <vector>
 
 #include "ImageOperations.h"
 #include "MatOperations.h"
 #include "Random.h"
+#include "Warps.h"
 
 namespace {
 
@@ -87,6 +90,28 @@ std::vector<Result> everything() {
     for (const MatOperation& o : matOperations())
         all.push_back(resultOf(o));
     return all;
+}
+
+// The draws of the fits are shared out between the threads as it happens; everything else is the same in all of them.
+TEST(Threads, RegistrationOfDistinctPictures) {
+    constexpr size_t kThreads = 4;
+    const kel::Image scene = drawnScene(240, 180, 3);
+    Plane H;
+    const kel::Image view = warped(scene.get(), {1.2, 20, 30, 0.9}, 400, H);
+    std::array<kelRegister::Result, kThreads> results;
+    std::vector<std::thread> threads;
+    for (kelRegister::Result& result : results)
+        threads.emplace_back([&] { result = kelRegister::registerPictures(scene.get(), view.get()); });
+    for (std::thread& thread : threads)
+        thread.join();
+    const std::vector<kelRegister::Feature> features = kelRegister::findFeatures(scene.get());
+    for (const kelRegister::Result& result : results) {
+        EXPECT_TRUE(result.found) << result.reason;
+        ASSERT_EQ(result.first.size(), features.size());
+        for (size_t i = 0; i < features.size(); ++i)
+            EXPECT_EQ(std::memcmp(result.first[i].descriptor, features[i].descriptor, sizeof features[i].descriptor), 0);
+        EXPECT_EQ(kelRegister::matchFeatures(result.first, result.second).size(), result.matches.size());
+    }
 }
 
 } // namespace
