@@ -155,8 +155,7 @@ struct LU {
         for (ptrdiff_t i = 0; i < n; ++i)
             std::copy_n(row(i) + begin, width, before + i * width);
         for (ptrdiff_t i = 1; begin > 0 && i < n; ++i)
-            for (ptrdiff_t k = 0; k < std::min(i, begin); ++k)
-                kel::subtractMultiple(row(i) + begin, row(i)[k], row(k) + begin, width);
+            kel::subtractMultiples(row(i) + begin, row(i), row(0) + begin, n, std::min(i, begin), width);
         for (ptrdiff_t j = begin; j < begin + width; ++j) {
             pivot(j);
             if (pivotRow != j)
@@ -174,6 +173,43 @@ struct LU {
     }
 };
 
+// An order that the compiler knows, the same bits without a call or a panel. False, and nothing written, where a finished row would
+// return as a pivot.
+template <int N> bool decomposeSmall(float* a, const float* rowScales, int* indx, float* parity) {
+    float A[N][N], scales[N], sign = 1.0f;
+    int picked[N], row = 0;
+    std::copy_n(a, N * N, A[0]);
+    std::copy_n(rowScales, N, scales);
+    for (int j = 0; j < N; ++j) {
+        float best = 0.0f;
+        for (int i = j; i < N; ++i) {
+            const float candidate = scales[i] * fabsf(A[i][j]);
+            row = candidate >= best ? i : row;
+            best = candidate >= best ? candidate : best;
+        }
+        if (row < j)
+            return false;
+        if (row != j) {
+            std::swap_ranges(A[row], A[row] + N, A[j]);
+            sign = -sign;
+            scales[row] = scales[j];
+        }
+        picked[j] = row;
+        if (A[j][j] == 0.0f)
+            A[j][j] = kTinyPivot;
+        const float reciprocal = 1.0f / A[j][j];
+        for (int i = j + 1; i < N; ++i) {
+            A[i][j] *= reciprocal;
+            for (int k = j + 1; k < N; ++k)
+                A[i][k] -= A[i][j] * A[j][k];
+        }
+    }
+    std::copy_n(A[0], N * N, a);
+    std::copy_n(picked, N, indx);
+    *parity = sign;
+    return true;
+}
+
 } // namespace
 
 bool kel::decomposeLU(float* a, int n, int* indx, float* parity) {
@@ -184,6 +220,8 @@ bool kel::decomposeLU(float* a, int n, int* indx, float* parity) {
     kel::Scratch<float, kel::kSmallOrder> scales(n);
     if (!rowScales(a, n, scales.data()))
         return false;
+    if (n == 4 && decomposeSmall<4>(a, scales.data(), indx, parity))
+        return true;
     kel::SquareScratch before(n * std::min<ptrdiff_t>(n, kPanel));
     LU lu = {a, n, scales.data(), indx, parity};
     for (ptrdiff_t begin = 0, finished; begin < n; begin += kPanel)

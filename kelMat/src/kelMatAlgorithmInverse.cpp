@@ -29,15 +29,32 @@ void solveIdentity(const float* LU, const int* indx, ptrdiff_t n, float* X) {
     for (ptrdiff_t i = 0; i < n; ++i) {
         if (indx[i] != i)
             std::swap_ranges(X + indx[i] * n, X + (indx[i] + 1) * n, X + i * n);
-        for (ptrdiff_t k = 0; k < i; ++k)
-            kel::subtractMultiple(X + i * n, LU[i * n + k], X + k * n, n);
+        kel::subtractMultiples(X + i * n, LU + i * n, X, n, i, n);
     }
     for (ptrdiff_t i = n - 1; i >= 0; --i) {
-        for (ptrdiff_t k = i + 1; k < n; ++k)
-            kel::subtractMultiple(X + i * n, LU[i * n + k], X + k * n, n);
+        kel::subtractMultiples(X + i * n, LU + i * n + i + 1, X + (i + 1) * n, n, n - i - 1, n);
         for (ptrdiff_t j = 0; j < n; ++j)
             X[i * n + j] /= LU[i * n + i];
     }
+}
+
+// The same for order 4, a row a vector.
+void solveIdentity4(const float* LU, const int* indx, float* X) {
+    __m128 row[4] = {_mm_setr_ps(1, 0, 0, 0), _mm_setr_ps(0, 1, 0, 0), _mm_setr_ps(0, 0, 1, 0), _mm_setr_ps(0, 0, 0, 1)};
+    const auto less = [=](__m128 r, int i, int k, __m128 other) {
+        return _mm_sub_ps(r, _mm_mul_ps(_mm_set1_ps(LU[4 * i + k]), other));
+    };
+    for (int i = 0; i < 3; ++i)
+        std::swap(row[i], row[indx[i]]);
+    const __m128 a = row[0], b = less(row[1], 1, 0, a), c = less(less(row[2], 2, 0, a), 2, 1, b),
+                 d = less(less(less(row[3], 3, 0, a), 3, 1, b), 3, 2, c);
+    const auto over = [=](__m128 r, int i) { return _mm_div_ps(r, _mm_set1_ps(LU[5 * i])); };
+    const __m128 z = over(d, 3), y = over(less(c, 2, 3, z), 2), x = over(less(less(b, 1, 2, y), 1, 3, z), 1),
+                 w = over(less(less(less(a, 0, 1, x), 0, 2, y), 0, 3, z), 0);
+    _mm_storeu_ps(X, w);
+    _mm_storeu_ps(X + 4, x);
+    _mm_storeu_ps(X + 8, y);
+    _mm_storeu_ps(X + 12, z);
 }
 
 // Whether no row was swapped with one above it, as a column without a candidate (all NaN) may have it.
@@ -53,7 +70,7 @@ bool swapsDownward(const int* indx, int n) {
 void kel::invertLU(const float* lu, int n, const int* indx, float* R) {
     const float* const end = lu + static_cast<ptrdiff_t>(n) * n;
     if (std::all_of(lu, end, [](float x) { return std::isfinite(x); }) && swapsDownward(indx, n))
-        return solveIdentity(lu, indx, n, R);
+        return n == 4 ? solveIdentity4(lu, indx, R) : solveIdentity(lu, indx, n, R);
     // One by one: the leading zeros of each column are skipped, which matters to infinities and to swaps upward.
     kel::Scratch<float, kel::kSmallOrder> column(n);
     for (int j = 0; j < n; ++j) {

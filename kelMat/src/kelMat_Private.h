@@ -72,6 +72,32 @@ inline void subtractMultiple(float* to, float factor, const float* from, ptrdiff
         to[i] -= factor * from[i];
 }
 
+// The same of `count` rows, `pitch` apart, with a factor each: for every element term by term in their order.
+inline void subtractMultiples(float* to, const float* factors, const float* rows, ptrdiff_t pitch, ptrdiff_t count,
+                              ptrdiff_t columns) {
+    constexpr int kVectors = 4; // kept in registers
+    ptrdiff_t c = 0;
+    for (; c + 4 * kVectors <= columns; c += 4 * kVectors) {
+        __m128 sums[kVectors];
+        for (int v = 0; v < kVectors; ++v)
+            sums[v] = _mm_loadu_ps(to + c + 4 * v);
+        for (ptrdiff_t k = 0; k < count; ++k)
+            for (int v = 0; v < kVectors; ++v)
+                sums[v] = _mm_sub_ps(sums[v], _mm_mul_ps(_mm_set1_ps(factors[k]), _mm_loadu_ps(rows + k * pitch + c + 4 * v)));
+        for (int v = 0; v < kVectors; ++v)
+            _mm_storeu_ps(to + c + 4 * v, sums[v]);
+    }
+    for (; c + 4 <= columns; c += 4) {
+        __m128 sum = _mm_loadu_ps(to + c);
+        for (ptrdiff_t k = 0; k < count; ++k)
+            sum = _mm_sub_ps(sum, _mm_mul_ps(_mm_set1_ps(factors[k]), _mm_loadu_ps(rows + k * pitch + c)));
+        _mm_storeu_ps(to + c, sum);
+    }
+    for (; c < columns; ++c)
+        for (ptrdiff_t k = 0; k < count; ++k)
+            to[c] -= factors[k] * rows[k * pitch + c];
+}
+
 // ---- kernels over elements that the caller owns: row by row without gaps, n x n where no other size is given -----------------
 
 // R = A B, A (rows x inner) and B (inner x columns), apart from R. Every element sums over `inner` in increasing order, from 0.
