@@ -1,8 +1,10 @@
 # The library with the kernels of one instruction set whatever the processor, for tests and measurements: the same objects but for
-# the one that chooses. Programs get it before the library itself where LD_LIBRARY_PATH names its folder, kernels/SET.
+# those that choose. Programs get it before the library itself where LD_LIBRARY_PATH names its folder, kernels/SET.
 function(kel_library_of set)
   add_library(kel_${set} SHARED EXCLUDE_FROM_ALL
-    $<FILTER:$<TARGET_OBJECTS:kel>,EXCLUDE,kelImage_Kernels[.]cpp> ${PROJECT_SOURCE_DIR}/kelImage/src/kelImage_Kernels.cpp)
+    "$<FILTER:$<TARGET_OBJECTS:kel>,EXCLUDE,(kelImage_Kernels|kelMatInliers)[.]cpp>"
+    ${PROJECT_SOURCE_DIR}/kelImage/src/kelImage_Kernels.cpp ${PROJECT_SOURCE_DIR}/kelMat/src/kelMatInliers.cpp)
+  target_include_directories(kel_${set} PRIVATE ${PROJECT_SOURCE_DIR}/common)
   target_compile_definitions(kel_${set} PRIVATE KEL_KERNELS=${set})
   target_link_libraries(kel_${set} PRIVATE kel_flags)
   target_link_options(kel_${set} PRIVATE $<TARGET_PROPERTY:kel,LINK_OPTIONS>)

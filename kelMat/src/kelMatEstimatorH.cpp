@@ -45,29 +45,16 @@ void fitFourPairs(kelMat& H, const float (&p)[4][4]) {
     kel::assign<3>(H, product);
 }
 
-// countInliers() for a homography.
-int countTransfers(const kelMat& H, const kelMatCorrespH& corresp, float threshold, int best, uint8_t* marks) {
-    const int n = corresp.m_Num;
-    const float* const h = H.m_Data;
-    const auto times = [h](int r, __m128 x, __m128 y) {
-        const __m128 xy = _mm_add_ps(_mm_mul_ps(x, _mm_set1_ps(h[3 * r])), _mm_mul_ps(y, _mm_set1_ps(h[3 * r + 1])));
-        return _mm_add_ps(xy, _mm_set1_ps(h[3 * r + 2]));
-    };
-    return kel::countInliers(n, threshold, best, marks, [&](int i) {
-        const __m128 x = kel::fourValues(corresp.m_SrcX, i, n), y = kel::fourValues(corresp.m_SrcY, i, n);
-        return kel::squaredDistances(times(0, x, y), times(1, x, y), times(2, x, y), kel::fourValues(corresp.m_DstX, i, n),
-                                     kel::fourValues(corresp.m_DstY, i, n));
-    });
-}
-
 struct Model {
     using Set = kelMatCorrespH;
     static constexpr int kColumns = 3, kLeastPairs = 5, kSample = 4, kEnoughInliers = 50;
     static void fillRows(float* row, const Set& set, int i) {
         ::fillRows(row, set.m_SrcX[i], set.m_SrcY[i], set.m_DstX[i], set.m_DstY[i]);
     }
-    static int count(const kelMat& H, const Set& set, float threshold, int best, uint8_t* marks) {
-        return countTransfers(H, set, threshold, best, marks);
+    static int count(const kelMat& M, const Set& set, float threshold, int best, uint8_t* marks) {
+        const kel::PairsView pairs = {
+            set.m_Num, {set.m_SrcX.data(), set.m_SrcY.data()}, {set.m_DstX.data(), set.m_DstY.data()}};
+        return kel::inlierKernels().plane(M.m_Data, pairs, threshold, best, marks);
     }
     static void fitSample(kelMat& H, const Set& set) {
         int a, b, c, d;

@@ -17,30 +17,16 @@ void fillRows(float* row, float X, float Y, float Z, float x, float y) {
     std::copy_n(rows, 2 * kUnknowns, row);
 }
 
-// countInliers() for a projection.
-int countProjections(const kelMat& P, const kelMatCorrespP& corresp, float threshold, int best, uint8_t* marks) {
-    const int n = corresp.m_Num;
-    const float* const p = P.m_Data;
-    const auto times = [p](int r, __m128 X, __m128 Y, __m128 Z) {
-        const __m128 xy = _mm_add_ps(_mm_mul_ps(X, _mm_set1_ps(p[4 * r])), _mm_mul_ps(Y, _mm_set1_ps(p[4 * r + 1])));
-        return _mm_add_ps(_mm_add_ps(xy, _mm_mul_ps(Z, _mm_set1_ps(p[4 * r + 2]))), _mm_set1_ps(p[4 * r + 3]));
-    };
-    return kel::countInliers(n, threshold, best, marks, [&](int i) {
-        const __m128 X = kel::fourValues(corresp.m_ObjX, i, n), Y = kel::fourValues(corresp.m_ObjY, i, n),
-                     Z = kel::fourValues(corresp.m_ObjZ, i, n);
-        return kel::squaredDistances(times(0, X, Y, Z), times(1, X, Y, Z), times(2, X, Y, Z),
-                                     kel::fourValues(corresp.m_ImgX, i, n), kel::fourValues(corresp.m_ImgY, i, n));
-    });
-}
-
 struct Model {
     using Set = kelMatCorrespP;
     static constexpr int kColumns = 4, kLeastPairs = 6, kSample = 6, kEnoughInliers = 400;
     static void fillRows(float* row, const Set& set, int i) {
         ::fillRows(row, set.m_ObjX[i], set.m_ObjY[i], set.m_ObjZ[i], set.m_ImgX[i], set.m_ImgY[i]);
     }
-    static int count(const kelMat& P, const Set& set, float threshold, int best, uint8_t* marks) {
-        return countProjections(P, set, threshold, best, marks);
+    static int count(const kelMat& M, const Set& set, float threshold, int best, uint8_t* marks) {
+        const kel::PairsView pairs = {
+            set.m_Num, {set.m_ObjX.data(), set.m_ObjY.data(), set.m_ObjZ.data()}, {set.m_ImgX.data(), set.m_ImgY.data()}};
+        return kel::inlierKernels().space(M.m_Data, pairs, threshold, best, marks);
     }
     static void fitSample(kelMat& P, const Set& set) {
         int i[kSample];

@@ -10,6 +10,7 @@
 #include <smmintrin.h>
 #include <vector>
 
+#include "kelMatInliers.h"
 #include "kelMat_Private.h"
 
 namespace kel {
@@ -93,58 +94,19 @@ template <int Columns> void denormalize(kelMat& M, const kelMat& T2, const kelMa
     M.setDataUnitize();
 }
 
-// Inlier marks of up to KEL_CORRESP_MAX pairs and more, eight to a byte.
+// Inlier marks, a byte each.
 class Marks {
 public:
-    explicit Marks(int n) : m_bytes((static_cast<size_t>(n) + 7) / 8) {}
+    explicit Marks(int n) : m_bytes(static_cast<size_t>(n)) {}
     uint8_t* bytes() { return m_bytes.data(); }
-    bool operator[](int i) const { return m_bytes[static_cast<size_t>(i) / 8] >> (i % 8) & 1; }
+    bool operator[](int i) const { return m_bytes[static_cast<size_t>(i)]; }
 
 private:
     std::vector<uint8_t> m_bytes;
 };
 
-// Values i .. i+3 of a sequence of n; beyond its end the last one again, so that nothing is computed but what a pair asks for.
-inline __m128 fourValues(const std::vector<float>& values, int i, int n) {
-    if (i + 4 <= n)
-        return _mm_loadu_ps(values.data() + i);
-    const float* const v = values.data();
-    const auto at = [=](int k) { return v[std::min(k, n - 1)]; };
-    return _mm_setr_ps(at(i), at(i + 1), at(i + 2), at(i + 3));
-}
-
-constexpr uint8_t kBitsOfNibble[16] = {0, 1, 1, 2, 1, 2, 2, 3, 1, 2, 2, 3, 2, 3, 3, 4};
-
-// Counts the pairs whose squared error is below threshold squared and marks them; squaredErrors(i) gives those of pairs i .. i+3.
-// A NaN error is no inlier. Gives up where the count can no longer exceed `best`, and then returns what it has counted so far.
-template <class SquaredErrors> int countInliers(int n, float threshold, int best, uint8_t* marks, SquaredErrors squaredErrors) {
-    constexpr int kBlock = 256;
-    const __m128 limit = _mm_set1_ps(threshold * threshold);
-    int count = 0;
-    for (int begin = 0; begin < n && count + (n - begin) > best; begin += kBlock) {
-        const int end = std::min(n, begin + kBlock);
-        for (int i = begin; i < end; i += 8) {
-            const int low = _mm_movemask_ps(_mm_cmpgt_ps(limit, squaredErrors(i)));
-            const int high = _mm_movemask_ps(_mm_cmpgt_ps(limit, squaredErrors(i + 4)));
-            const unsigned valid = end - i >= 8 ? 0xffu : (1u << (end - i)) - 1;
-            const unsigned bits = static_cast<unsigned>(high << 4 | low) & valid;
-            marks[i / 8] = static_cast<uint8_t>(bits);
-            count += kBitsOfNibble[bits & 15] + kBitsOfNibble[bits >> 4];
-        }
-    }
-    return count;
-}
-
 constexpr int kCountAll = -1;    // a `best` that every count exceeds
 constexpr int kMostDraws = 1500; // of a robust fit
-
-// The error between what a homogeneous point (x, y) / w is and what it should be, squared, with the one true division that
-// cvtPoint() makes.
-inline __m128 squaredDistances(__m128 x, __m128 y, __m128 w, __m128 toX, __m128 toY) {
-    const __m128 s = _mm_div_ps(_mm_set1_ps(1.0f), w);
-    const __m128 dx = _mm_sub_ps(toX, _mm_mul_ps(x, s)), dy = _mm_sub_ps(toY, _mm_mul_ps(y, s));
-    return _mm_add_ps(_mm_mul_ps(dx, dx), _mm_mul_ps(dy, dy));
-}
 
 // Draws for 99 % confidence of one sample of four inliers, where `count` of n pairs are inliers. The six-point fit uses the same
 // exponent; callers rely on its number of draws.
@@ -170,7 +132,7 @@ inline int truncated(double value) {
 //   kSample, kEnoughInliers                pairs of a sample; inliers that end the search at once
 //   fitSample(M, set)                      fits M exactly to kSample pairs, which it draws
 //   isPlausible(M)                         whether a candidate or a refit is taken at all
-//   count(M, set, threshold, best, marks)  as countInliers()
+//   count(M, set, threshold, best, marks)  as CountInliers does
 //   fewerDraws(draws, needed)              the limit of draws after a better candidate, `needed` from drawsNeeded()
 
 // M = the least-squares solution of the design rows of `count` pairs, scaled so that its last element is 1. The rows are left with
