@@ -23,8 +23,8 @@ struct Lanes2 {
     static Lanes2 loadBytesAsLongs(const uint8_t* p) {
         return {_mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(p)))};
     }
-    static Lanes2 loadEights(const void* p, const int32_t* index) {
-        return of(Lanes1::loadEights(p, index), Lanes1::loadEights(p, index + 2));
+    static Lanes2 loadEights(const void* p, const int32_t* index, ptrdiff_t apart) {
+        return of(Lanes1::loadEights(p, index, 0), Lanes1::loadEights(p, index + apart, 0));
     }
     static Lanes2 zero() { return {_mm256_setzero_si256()}; }
     static Lanes2 bytes(int value) { return {_mm256_set1_epi8(static_cast<char>(value))}; }

@@ -29,9 +29,9 @@ struct Lanes4 {
         return {_mm512_cvtepu8_epi16(_mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)))};
     }
     static Lanes4 loadBytesAsLongs(const uint8_t* p) { return {_mm512_cvtepu8_epi32(Lanes1::load(p).v)}; }
-    static Lanes4 loadEights(const void* p, const int32_t* index) {
-        return of(Lanes1::loadEights(p, index), Lanes1::loadEights(p, index + 2), Lanes1::loadEights(p, index + 4),
-                  Lanes1::loadEights(p, index + 6));
+    static Lanes4 loadEights(const void* p, const int32_t* index, ptrdiff_t apart) {
+        return of(Lanes1::loadEights(p, index, 0), Lanes1::loadEights(p, index + apart, 0),
+                  Lanes1::loadEights(p, index + 2 * apart, 0), Lanes1::loadEights(p, index + 3 * apart, 0));
     }
     static Lanes4 zero() { return {_mm512_setzero_si512()}; }
     static Lanes4 bytes(int value) { return {_mm512_set1_epi8(static_cast<char>(value))}; }

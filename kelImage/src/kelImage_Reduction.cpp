@@ -73,11 +73,11 @@ public:
     }
 
 private:
-    // Every pair of inputs of every output: where it starts, and its weights side by side, four times. The last input comes as the
-    // second of its pair, so that nothing behind it is read.
+    // Every pair of inputs of every output: where it starts, and its weights side by side, bytes of them four times. The last
+    // input comes as the second of its pair, so that nothing behind it is read.
     void fillTables(kelValue_s32 inputs) {
         const bool words = m_ratio.box > kByteBox;
-        const ptrdiff_t count = m_pairs * m_pitch, each = words ? 8 : 4;
+        const ptrdiff_t count = m_pairs * m_pitch, each = words ? 2 : 4;
         m_index = allocate<int32_t>(count);
         m_weights = allocate<uint16_t>(each * count);
         for (ptrdiff_t i = 0; i < count; ++i) {

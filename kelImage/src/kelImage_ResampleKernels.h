@@ -48,7 +48,7 @@ constexpr Sixteen kPixels = {{0, -1, 1, -1, 2, -1, -1, -1, 8, -1, 9, -1, 10, -1,
 
 // Words of whole vectors of two pixels a lane; a weight stands four times a pixel.
 template <class V> V mixedAcross(const uint32_t* s, const int32_t* index, const uint16_t* weights) {
-    const V pairs = V::loadEights(s, index);
+    const V pairs = V::loadEights(s, index, 2);
     return mixed(shuffle(pairs, V::every(kPixels)), shuffle(pairs, V::every(kNeighbours)), V::load(weights));
 }
 
@@ -89,14 +89,20 @@ struct WordBox {
     uint32_t reciprocal;
     explicit WordBox(uint32_t box) : reciprocal((65536 + box - 1) / box) {}
 
-    // Two pixels a lane in words, from all their pairs of inputs.
+    // Four pixels a lane from all their pairs of inputs.
     template <class V>
     V across(const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t pitch) const {
         static constexpr Sixteen sideBySide = {{0, 4, 1, 5, 2, 6, 3, 7, 8, 12, 9, 13, 10, 14, 11, 15}};
-        V sums = V::zero();
-        for (ptrdiff_t k = 0; k < pairs; ++k, index += pitch, weights += 4 * pitch)
-            sums = addWords(sums, weighBytes(shuffle(V::loadEights(s, index), V::every(sideBySide)), V::load(weights)));
-        return divided(sums);
+        constexpr ptrdiff_t half = 2 * V::kLanes;
+        const auto weighedPair = [=](ptrdiff_t i) {
+            return weighBytes(shuffle(V::loadEights(s, index + i, 2), V::every(sideBySide)), V::load(weights + 4 * i));
+        };
+        V low = V::zero(), high = V::zero();
+        for (ptrdiff_t k = 0; k < pairs; ++k) {
+            low = addWords(low, weighedPair(k * pitch));
+            high = addWords(high, weighedPair(k * pitch + half));
+        }
+        return narrowedWords(divided(low), divided(high));
     }
     // Whole vectors of bytes of such rows, again in pairs.
     template <class V> V down(const uint8_t* const* row, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t i) const {
@@ -113,24 +119,31 @@ private:
     template <class V> V divided(V sums) const { return mulHighWords(sums, V::words(static_cast<int>(reciprocal))); }
 };
 
+// One pixel of an eight, and its neighbour, side by side as words of four channels; and its weights from those of four pixels.
+template <int first>
+constexpr Sixteen kWordsSideBySide = {
+    {first, -1, first + 4, -1, first + 1, -1, first + 5, -1, first + 2, -1, first + 6, -1, first + 3, -1, first + 7, -1}};
+template <int n>
+constexpr Sixteen kLong = {{n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3}};
+
 // Weights up to 4103: sums are longs.
 struct LongBox {
-    static constexpr int kWordsOfWeights = 8; // two words, four times
+    static constexpr int kWordsOfWeights = 2;
     uint32_t reciprocal;
     explicit LongBox(uint32_t box) : reciprocal(static_cast<uint32_t>(((uint64_t(1) << 32) + box - 1) / box)) {}
 
     template <class V>
     V across(const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t pitch) const {
-        static constexpr Sixteen first = {{0, -1, 4, -1, 1, -1, 5, -1, 2, -1, 6, -1, 3, -1, 7, -1}},
-                                 second = {{8, -1, 12, -1, 9, -1, 13, -1, 10, -1, 14, -1, 11, -1, 15, -1}};
-        V sums[2] = {V::zero(), V::zero()}; // of the two pixels of every lane
-        for (ptrdiff_t k = 0; k < pairs; ++k, index += pitch, weights += 8 * pitch) {
-            const V eights = V::loadEights(s, index);
-            const auto* const w = reinterpret_cast<const uint8_t*>(weights);
-            sums[0] = addLongs(sums[0], weighWords(shuffle(eights, V::every(first)), V::loadLanes(w, 32)));
-            sums[1] = addLongs(sums[1], weighWords(shuffle(eights, V::every(second)), V::loadLanes(w + 16, 32)));
+        const V first = V::every(kWordsSideBySide<0>), second = V::every(kWordsSideBySide<8>);
+        V a = V::zero(), b = a, c = a, d = a;
+        for (ptrdiff_t k = 0; k < pairs; ++k, index += pitch, weights += 2 * pitch) {
+            const V ab = V::loadEights(s, index, 4), cd = V::loadEights(s, index + 2, 4), w = V::load(weights);
+            a = addLongs(a, weighWords(shuffle(ab, first), shuffle(w, V::every(kLong<0>))));
+            b = addLongs(b, weighWords(shuffle(ab, second), shuffle(w, V::every(kLong<4>))));
+            c = addLongs(c, weighWords(shuffle(cd, first), shuffle(w, V::every(kLong<8>))));
+            d = addLongs(d, weighWords(shuffle(cd, second), shuffle(w, V::every(kLong<12>))));
         }
-        return packLongs(divided(sums[0]), divided(sums[1]));
+        return packWords(packLongs(divided(a), divided(b)), packLongs(divided(c), divided(d)));
     }
     template <class V> V down(const uint8_t* const* row, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t i) const {
         const V zero = V::zero();
@@ -156,10 +169,7 @@ void reduceAcross(uint32_t* d, const uint32_t* s, const int32_t* index, const ui
                   ptrdiff_t width, uint32_t box) {
     const Box by(box);
     walkColumns<4>(0, width, [=](auto of, ptrdiff_t i) {
-        using V = LanesOf<decltype(of)>;
-        constexpr ptrdiff_t half = 2 * V::kLanes, words = Box::kWordsOfWeights;
-        store(d + i, narrowedWords(by.template across<V>(s, index + i, weights + words * i, pairs, width),
-                                   by.template across<V>(s, index + i + half, weights + words * (i + half), pairs, width)));
+        store(d + i, by.template across<LanesOf<decltype(of)>>(s, index + i, weights + Box::kWordsOfWeights * i, pairs, width));
     });
 }
 
