@@ -12,7 +12,8 @@ namespace kel_bench {
 // Ratios kel / best peer by operation and size.
 using Ratios = std::map<std::pair<std::string, std::string>, double>;
 
-// One line: times in microseconds, NAN where there is none; `avx2` and `sse41` are ratios with the kernels of those instructions.
+// One line: times in microseconds, NAN where there is none; `avx2` and `sse41` are ratios with the kernels of those
+// instructions.
 struct Row {
     std::string operation, size, peer, differs;
     double kel, best, bound, avx2, sse41;

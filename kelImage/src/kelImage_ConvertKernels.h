@@ -140,8 +140,8 @@ void wordMeanOfFourSpread(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
 
 // ---- Channels that change places
 
-// Sixteen pixels a lane in three vectors: byte b of the 48 comes from byte b + 2, b or b - 2, which may be in the next or in the
-// vector before.
+// Sixteen pixels a lane in three vectors: byte b of the 48 comes from byte b + 2, b or b - 2, which may be in the next or in
+// the vector before.
 void threeReversed(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
     walk<16, 3, 3>(d, s, pixels, [](auto of, uint8_t* to, const uint8_t* from) {
         using V = LanesOf<decltype(of)>;

@@ -1,5 +1,5 @@
-// The conversion dispatcher with its route table, and the converters that walk rows by step and leave padding untouched. Six more
-// names forward to the converters over whole areas. What is done to pixels is the kernels' business.
+// The conversion dispatcher with its route table, and the converters that walk rows by step and leave padding untouched. Six
+// more names forward to the converters over whole areas. What is done to pixels is the kernels' business.
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"
 

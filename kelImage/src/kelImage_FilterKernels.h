@@ -1,5 +1,5 @@
-// Kernels of the neighbourhood filters: Gaussian 5x5 and 7x7 by rows, cross operator, Sobel magnitude, and the candidates of the
-// keypoint detector.
+// Kernels of the neighbourhood filters: Gaussian 5x5 and 7x7 by rows, cross operator, Sobel magnitude, and the candidates of
+// the keypoint detector.
 #ifndef KEL_IMAGE_FILTER_KERNELS_H
 #define KEL_IMAGE_FILTER_KERNELS_H
 
@@ -12,7 +12,8 @@ template <int first, int second, class V> V weighed(V pairs) {
     return weighBytes(pairs, V::words(second * 256 + (first & 255)));
 }
 
-// ---- Gaussian 5x5: weights (1, 4, 6, 4, 1) both ways, rounded once. Sums across are 0..4080; down they are at most 65280, 65408
+// ---- Gaussian 5x5: weights (1, 4, 6, 4, 1) both ways, rounded once. Sums across are 0..4080; down they are at most 65280,
+// 65408
 // rounded, which is unsigned 16 bits.
 
 constexpr ptrdiff_t kReach5 = 2; // taps on either side of the centre, and the columns at either end that come out as zero
@@ -98,8 +99,8 @@ template <class V> Two<V> smooth(V v01, V v23, V v45, V v67) {
     return {sixtyFourth(first), sixtyFourth(second)};
 }
 
-// Columns begin .. end-1, a multiple of 8, and 8 zeros behind them. Pairs of neighbouring bytes give the even columns first, the
-// odd ones second.
+// Columns begin .. end-1, a multiple of 8, and 8 zeros behind them. Pairs of neighbouring bytes give the even columns first,
+// the odd ones second.
 void sevenAcross(uint8_t* t, const uint8_t* s, ptrdiff_t begin, ptrdiff_t end) {
     const ptrdiff_t whole = begin + (end - begin) / 16 * 16;
     walkColumns<16>(begin, whole, [=](auto of, ptrdiff_t x) {
@@ -163,7 +164,8 @@ void crossRow(int16_t* d, const uint8_t* s, ptrdiff_t pitch, ptrdiff_t distance,
     });
 }
 
-// ---- Sobel magnitude in single precision, by the thread's rounding mode. Gradients are exact in 16 bits (-1020..1020), the sum
+// ---- Sobel magnitude in single precision, by the thread's rounding mode. Gradients are exact in 16 bits (-1020..1020), the
+// sum
 // of their squares, at most 2080800, in single precision.
 
 template <class V> V rootsOfSquares(V gxgy) {

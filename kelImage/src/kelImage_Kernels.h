@@ -30,8 +30,8 @@ using ReduceDown = void (*)(uint8_t* d, const uint8_t* const* row, const uint16_
 
 // What they compute stands where they are defined, in the files named after the families.
 struct Kernels {
-    // Converters. The fourth channel becomes 0, save where four channels are reversed, which keeps it. A spread goes to every third
-    // byte or word; what lies between is not written.
+    // Converters. The fourth channel becomes 0, save where four channels are reversed, which keeps it. A spread goes to every
+    // third byte or word; what lies between is not written.
     Run greyToThree, greyToFour, greyToWords, magnitudeToGrey, magnitudeToThree, magnitudeToFour;
     Run meanOfThree, wordMeanOfThree, meanOfFourSpread, wordMeanOfFourSpread;
     Run threeReversed, threeToFour, threeToFourReversed, fourToThree, fourToThreeReversed, fourReversed;

@@ -39,7 +39,8 @@ struct Lanes1 {
         __builtin_memcpy(&four, p, sizeof four);
         return {_mm_cvtepu8_epi32(_mm_cvtsi32_si128(four))};
     }
-    // Eight bytes from addresses p + 4 * index, two to a lane; the indices of a lane are `apart` behind those of the one before.
+    // Eight bytes from addresses p + 4 * index, two to a lane; the indices of a lane are `apart` behind those of the one
+    // before.
     static Lanes1 loadEights(const void* p, const int32_t* index, ptrdiff_t) {
         const auto* const base = static_cast<const uint8_t*>(p);
         const __m128i first = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(base + 4 * ptrdiff_t(index[0])));
@@ -252,8 +253,8 @@ inline Lanes1 evenLongs(Lanes1 a, Lanes1 b) {
 inline Lanes1 oddLongs(Lanes1 a, Lanes1 b) {
     return {_mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(a.v), _mm_castsi128_ps(b.v), _MM_SHUFFLE(3, 1, 3, 1)))};
 }
-// What has a half of each lane from a and the other from b, as packs and every second long have, in the order of memory: all of a,
-// then all of b.
+// What has a half of each lane from a and the other from b, as packs and every second long have, in the order of memory: all of
+// a, then all of b.
 inline Lanes1 ordered(Lanes1 ab) {
     return ab;
 }

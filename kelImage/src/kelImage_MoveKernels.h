@@ -18,8 +18,8 @@ template <int N> constexpr Sixteen reversedPixels() {
 }
 template <int N> constexpr Sixteen kReversed = reversedPixels<N>();
 
-// As many blocks as fit from column x on. With three bytes a pixel a block touches one byte before the source's and one behind the
-// destination's, too.
+// As many blocks as fit from column x on. With three bytes a pixel a block touches one byte before the source's and one behind
+// the destination's, too.
 template <class V, int N> void reverseBlocks(uint8_t* d, const uint8_t* s, ptrdiff_t& x, ptrdiff_t width) {
     constexpr ptrdiff_t pixels = N == 3 ? V::kThrees : V::kBytes / N, spare = N == 3;
     for (; x + pixels + spare <= width; x += pixels) {

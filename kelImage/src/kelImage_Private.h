@@ -56,8 +56,8 @@ inline ptrdiff_t paddedWidth(const kelImage_t* image) {
     return (static_cast<ptrdiff_t>(image->width) + 15) / 16 * 16;
 }
 
-// A filter does blocks of `block` columns from column `margin`: a block at x is done while x < width - margin. Returns the first
-// column after the last block, `margin` where there is none; it is never beyond the row's step.
+// A filter does blocks of `block` columns from column `margin`: a block at x is done while x < width - margin. Returns the
+// first column after the last block, `margin` where there is none; it is never beyond the row's step.
 constexpr kelValue_s32 blocksEnd(kelValue_s32 width, kelValue_s32 margin, kelValue_s32 block) {
     return width > 2 * margin ? margin + (width - 2 * margin + block - 1) / block * block : margin;
 }

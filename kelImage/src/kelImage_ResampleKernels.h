@@ -7,7 +7,8 @@
 
 namespace {
 
-// ---- Grey at whole-number ratios: (a + b + c + d + 2) / 4 of a pixel, its neighbour, and those below. The compiler makes vectors
+// ---- Grey at whole-number ratios: (a + b + c + d + 2) / 4 of a pixel, its neighbour, and those below. The compiler makes
+// vectors
 // of it for the usual ratios.
 
 template <int R>
@@ -79,7 +80,8 @@ void mixRows(uint8_t* d, const uint8_t* above, const uint8_t* below, int weight,
         d[i] = static_cast<uint8_t>((above[i] * (256 - weight) + below[i] * weight) >> 8);
 }
 
-// ---- Reduction of four-byte pixels: averages of inputs under a box, each with its weight, rounding down. Inputs come in pairs,
+// ---- Reduction of four-byte pixels: averages of inputs under a box, each with its weight, rounding down. Inputs come in
+// pairs,
 // whose weights stand side by side. Division by the box is a multiplication with its reciprocal, rounded up: exact in 16 bits
 // while 255 * box * box < 2^16, in 32 bits for boxes up to 4103.
 
@@ -162,8 +164,8 @@ private:
     template <class V> V divided(V sums) const { return mulHighLongs(sums, V::longs(static_cast<int>(reciprocal))); }
 };
 
-// Pixel i averages the pairs of neighbours from s[index[i]], s[index[pitch + i]], ... on; `width`, a multiple of 4, is the pitch
-// of both tables in pixels.
+// Pixel i averages the pairs of neighbours from s[index[i]], s[index[pitch + i]], ... on; `width`, a multiple of 4, is the
+// pitch of both tables in pixels.
 template <class Box>
 void reduceAcross(uint32_t* d, const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t pairs,
                   ptrdiff_t width, uint32_t box) {

@@ -1,5 +1,5 @@
-// How kernels walk: wide blocks as long as they fit, then blocks of one lane, then what is left of a row. Rests on a vocabulary of
-// lanes that is included before, and on the name Wide for the widest of its types.
+// How kernels walk: wide blocks as long as they fit, then blocks of one lane, then what is left of a row. Rests on a vocabulary
+// of lanes that is included before, and on the name Wide for the widest of its types.
 #ifndef KEL_IMAGE_WALK_H
 #define KEL_IMAGE_WALK_H
 
@@ -11,9 +11,9 @@ namespace {
 template <class V> struct Of { using Lanes = V; };
 template <class T> using LanesOf = typename T::Lanes;
 
-// Calls body(of, d, s) for blocks of N units a lane, of D bytes in the destination and S in the source. Blocks may read or write
-// up to `spare` units behind their own, as there are always some that follow; the rest of the run goes through a buffer, so that
-// nothing beside its own units is touched.
+// Calls body(of, d, s) for blocks of N units a lane, of D bytes in the destination and S in the source. Blocks may read or
+// write up to `spare` units behind their own, as there are always some that follow; the rest of the run goes through a buffer,
+// so that nothing beside its own units is touched.
 template <int N, int D, int S, int spare = 0, class Body>
 inline void walk(uint8_t* d, const uint8_t* s, ptrdiff_t units, Body body) {
     constexpr ptrdiff_t wide = N * Wide::kLanes;
@@ -31,7 +31,8 @@ inline void walk(uint8_t* d, const uint8_t* s, ptrdiff_t units, Body body) {
     }
 }
 
-// Calls body(of, x) for blocks of N columns a lane from `begin` on, while they start before `end`; end - begin is a multiple of N.
+// Calls body(of, x) for blocks of N columns a lane from `begin` on, while they start before `end`; end - begin is a multiple of
+// N.
 template <int N, class Body> inline void walkColumns(ptrdiff_t begin, ptrdiff_t end, Body body) {
     ptrdiff_t x = begin;
     for (; x + N * Wide::kLanes <= end; x += N * Wide::kLanes)
