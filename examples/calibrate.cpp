@@ -15,6 +15,7 @@ using namespace kel_examples;
 namespace {
 
 constexpr int kWidth = 640, kHeight = 480;
+constexpr Colour kUsed = {0, 230, 60}, kLeftOut = {230, 40, 40}, kEstimate = {230, 230, 230};
 
 struct Options {
     int pairs = 200;
@@ -103,14 +104,17 @@ Image drawReprojection(const kelMatCorrespP& pairs, kelMat P, const std::vector<
     std::fill_n(picture->data, picture->size, static_cast<unsigned char>(24));
     for (int i = 0; i < pairs.m_Num; ++i) {
         const float x = pairs.m_ImgX[i], y = pairs.m_ImgY[i];
-        const Colour colour = inlier[i] ? Colour{0, 230, 60} : Colour{230, 40, 40};
+        const Colour colour = inlier[i] ? kUsed : kLeftOut;
         drawLine(picture, x - 3, y, x + 3, y, colour);
         drawLine(picture, x, y - 3, x, y + 3, colour);
         float u, v;
         P.cvtPoint(pairs.m_ObjX[i], pairs.m_ObjY[i], pairs.m_ObjZ[i], &u, &v);
         if (std::fabs(u) < 1e5f && std::fabs(v) < 1e5f)
-            drawCircle(picture, u, v, 5, {230, 230, 230});
+            drawCircle(picture, u, v, 5, kEstimate);
     }
+    drawText(picture, 8, 8, "USED", kUsed);
+    drawText(picture, 8, 28, "LEFT OUT", kLeftOut);
+    drawText(picture, 8, 48, "ESTIMATE", kEstimate);
     return picture;
 }
 
@@ -153,10 +157,10 @@ int calibrate(const Options& options) {
 
 int main(int argc, char** argv) {
     Options options;
-    CLI::App app(
-        "Makes a random camera and noisy pairs of points, some of them spoilt, fits the projection robustly and splits it into "
-        "intrinsics, rotation and translation. Exit status: 0 fitted, 1 bad input, 2 no reliable projection.",
-        "calibrate");
+    CLI::App app("Works on rendered points: makes a random camera and noisy pairs of points, some of them spoilt, fits the "
+                 "projection robustly and splits it into "
+                 "intrinsics, rotation and translation. Exit status: 0 fitted, 1 bad input, 2 no reliable projection.",
+                 "calibrate");
     app.add_option("--pairs", options.pairs, "number of pairs")
         ->check(CLI::Range(6, int(KEL_CORRESP_MAX)))
         ->capture_default_str();

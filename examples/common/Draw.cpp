@@ -2,8 +2,10 @@
 #include "Draw.h"
 
 #include <algorithm>
+#include <array>
 #include <cmath>
 #include <cstring>
+#include <map>
 
 #include "Registration.h"
 
@@ -60,6 +62,26 @@ void drawCircle(Image& picture, float x, float y, float radius, Colour colour) {
     }
 }
 
+void drawText(Image& picture, int x, int y, const std::string& text, Colour colour) {
+    // Seven rows of five pixels a letter, the leftmost in the highest of five bits.
+    static const std::map<char, std::array<int, 7>> letters = {
+        {'A', {14, 17, 17, 31, 17, 17, 17}}, {'D', {30, 17, 17, 17, 17, 17, 30}}, {'E', {31, 16, 16, 30, 16, 16, 31}},
+        {'F', {31, 16, 16, 30, 16, 16, 16}}, {'I', {14, 4, 4, 4, 4, 4, 14}},      {'L', {16, 16, 16, 16, 16, 16, 31}},
+        {'M', {17, 27, 21, 21, 17, 17, 17}}, {'O', {14, 17, 17, 17, 17, 17, 14}}, {'R', {30, 17, 17, 30, 20, 18, 17}},
+        {'S', {15, 16, 16, 14, 1, 1, 30}},   {'T', {31, 4, 4, 4, 4, 4, 4}},       {'U', {17, 17, 17, 17, 17, 17, 14}}};
+    for (const char c : text) {
+        const auto letter = letters.find(c);
+        for (int row = 0; row < 7 && letter != letters.end(); ++row)
+            for (int column = 0; column < 5; ++column)
+                if (letter->second[static_cast<size_t>(row)] >> (4 - column) & 1)
+                    for (const int dx : {0, 1}) // twice the size
+                        for (const int dy : {0, 1})
+                            plot(picture, static_cast<float>(x + 2 * column + dx), static_cast<float>(y + 2 * row + dy),
+                                 colour);
+        x += 12;
+    }
+}
+
 Image drawKeypoints(const Image& first, const Image& second, const std::vector<Feature>& ofFirst,
                     const std::vector<Feature>& ofSecond) {
     Image both = sideBySide(first, second);
@@ -79,14 +101,21 @@ Image drawKeypoints(const Image& first, const Image& second, const std::vector<F
 
 Image drawMatches(const Image& first, const Image& second, const std::vector<Feature>& ofFirst,
                   const std::vector<Feature>& ofSecond, const std::vector<Match>& matches, const std::vector<bool>& inlier) {
+    constexpr size_t kMost = 60; // of either kind: hundreds of lines would hide the pictures
     Image both = sideBySide(first, second);
-    for (const bool pass : {false, true}) // inliers over the others
-        for (size_t i = 0; i < matches.size(); ++i)
-            if (inlier[i] == pass) {
+    for (const bool pass : {false, true}) { // inliers over the others
+        const size_t all = static_cast<size_t>(std::count(inlier.begin(), inlier.end(), pass)), shown = std::min(all, kMost);
+        for (size_t i = 0, seen = 0; i < matches.size(); ++i) {
+            if (inlier[i] != pass)
+                continue;
+            ++seen;
+            if (seen * shown / all > (seen - 1) * shown / all) { // evenly from first to last
                 const Feature &a = ofFirst[matches[i].first], &b = ofSecond[matches[i].second];
                 const Colour colour = pass ? Colour{0, 230, 60} : Colour{230, 40, 40};
                 drawLine(both, a.x, a.y, static_cast<float>(first->width) + b.x, b.y, colour);
             }
+        }
+    }
     return both;
 }
 

@@ -16,11 +16,14 @@ struct Colour {
 void drawLine(Image& picture, float x0, float y0, float x1, float y1, Colour colour);
 void drawCircle(Image& picture, float x, float y, float radius, Colour colour);
 
+// Capitals, as far as the programs' legends need them, 10 x 14 pixels each; what else there is leaves a blank.
+void drawText(Image& picture, int x, int y, const std::string& text, Colour colour);
+
 // Both pictures side by side with their features.
 Image drawKeypoints(const Image& first, const Image& second, const std::vector<Feature>& ofFirst,
                     const std::vector<Feature>& ofSecond);
 
-// Both pictures side by side; inliers are joined in green, other matches in red.
+// Both pictures side by side; inliers are joined in green, other matches in red, a sample of 60 of either kind.
 Image drawMatches(const Image& first, const Image& second, const std::vector<Feature>& ofFirst,
                   const std::vector<Feature>& ofSecond, const std::vector<Match>& matches, const std::vector<bool>& inlier);
 
