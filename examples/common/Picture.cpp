@@ -190,7 +190,8 @@ std::vector<uint8_t> readFile(const std::string& path) {
             fail(path, std::string("cannot be read: ") + std::strerror(errno));
         if (formatOf(bytes.data(), bytes.size()) == Format::unknown)
             failAsUnknown(path, bytes.size());
-        if (bytes.size() > kMostBytes)
+        if (bytes.size() > kMostBytes || (before == 0 && std::filesystem::is_regular_file(path, code) &&
+                                          std::filesystem::file_size(path, code) > kMostBytes))
             fail(path, "is larger than a picture may be, " + std::to_string(kMostBytes) + " bytes");
     } while (got == std::exchange(wanted, kPiece));
     return bytes;
