@@ -7,9 +7,11 @@
 #include <iostream>
 #include <vector>
 
+#include <kel/kelRegister.h>
+
 #include "common/Program.h"
-#include "common/Registration.h"
 #include "common/Video.h"
+#include "common/Warp.h"
 
 using namespace kel_examples;
 
@@ -99,17 +101,19 @@ public:
         Image half(m_size.width / 2, m_size.height / 2, KEL_PIXEL_TYPE_U8G);
         if (half->width < 2 || half->height < 2)
             return;
-        clearKelImage(half.get()); // its padding counts for the contrast
         resizeKelImageHalf(half.get(), luma.get());
-        std::vector<Feature> features = findFeatures(half, kMostFeatures);
-        const Size halfSize = {half->width, half->height};
-        const std::vector<Match> matches = matchFeatures(features, m_before);
-        const Registration motion = fitHomography(features, m_before, matches, halfSize, halfSize, kThreshold);
-        m_before = std::move(features);
-        if (motion.H.m_IsCreated)
-            follow(m_correction * fullSize(motion.H));
-        else
-            m_correction.setDataIdentity(1); // a cut: start anew
+        if (m_before) {
+            kelRegister::Options options;
+            options.threshold = kThreshold;
+            options.mostFeatures = kMostFeatures;
+            options.views = false;
+            const kelRegister::Result motion = kelRegister::registerPictures(half.get(), m_before.get(), options);
+            if (motion.found)
+                follow(m_correction * fullSize(motion.H));
+            else
+                m_correction.setDataIdentity(1); // a cut: start anew
+        }
+        m_before = std::move(half);
     }
 
 private:
@@ -145,7 +149,7 @@ private:
     Size m_size;
     float m_farthest; // pixels that a correction may move a corner
     kelMat m_correction;
-    std::vector<Feature> m_before;
+    Image m_before; // halved
 };
 
 int stabilize(const Options& options) {

@@ -6,8 +6,11 @@
 #include <cmath>
 #include <cstring>
 #include <map>
+#include <set>
+#include <utility>
+#include <vector>
 
-#include "Registration.h"
+#include "Warp.h"
 
 namespace kel_examples {
 
@@ -82,82 +85,143 @@ void drawText(Image& picture, int x, int y, const std::string& text, Colour colo
     }
 }
 
-Image drawKeypoints(const Image& first, const Image& second, const std::vector<Feature>& ofFirst,
-                    const std::vector<Feature>& ofSecond) {
+namespace {
+
+using kelRegister::Feature;
+using kelRegister::Match;
+using kelRegister::Result;
+
+// Some of many, spread evenly over a picture: the first of every cell of a grid, as many cells as are asked for, about.
+std::vector<const Match*> spreadOut(const Result& r, Size size, bool inliers, int most) {
+    const float cell = std::sqrt(static_cast<float>(size.width) * static_cast<float>(size.height) / static_cast<float>(most));
+    std::set<std::pair<int, int>> taken;
+    std::vector<const Match*> some;
+    for (const Match& match : r.matches) {
+        const Feature& f = r.first[match.first];
+        if (match.inlier == inliers && taken.emplace(static_cast<int>(f.x / cell), static_cast<int>(f.y / cell)).second)
+            some.push_back(&match);
+    }
+    return some;
+}
+
+Colour colourAt(float share) {
+    const uint8_t* const c = KEL_COLOR_TABLE_PSEUDO[std::clamp(static_cast<int>(10 + 44 * share), 0, 63)];
+    return {c[0], c[1], c[2]};
+}
+
+// A canvas that holds the second picture and the first one's corners; a strong perspective may throw a corner far away, and so the
+// canvas ends at three times the second's size.
+struct Canvas {
+    int left, top;
+    Size size;
+    Canvas(const Image& first, const Image& second, kelMat H) {
+        constexpr float kMostTimes = 3;
+        float x0 = 0, y0 = 0, x1 = static_cast<float>(second->width), y1 = static_cast<float>(second->height);
+        const float limitX = kMostTimes * x1, limitY = kMostTimes * y1;
+        for (const float x : {0.0f, static_cast<float>(first->width - 1)})
+            for (const float y : {0.0f, static_cast<float>(first->height - 1)}) {
+                float u, v;
+                H.cvtPoint(x, y, &u, &v);
+                x0 = std::min(x0, std::max(u, -limitX));
+                y0 = std::min(y0, std::max(v, -limitY));
+                x1 = std::max(x1, std::min(u + 1, limitX));
+                y1 = std::max(y1, std::min(v + 1, limitY));
+            }
+        left = static_cast<int>(std::ceil(-x0));
+        top = static_cast<int>(std::ceil(-y0));
+        size = {static_cast<int>(x1) + left, static_cast<int>(y1) + top};
+    }
+};
+
+// How far each pixel is from the picture's edge, 1 .. 255 in the middle; warped, 0 tells where there is no picture.
+Image distancesToEdge(Size size) {
+    Image distances(size.width, size.height, KEL_PIXEL_TYPE_U8G);
+    const int scale = std::max(1, std::min(size.width, size.height) / 2);
+    for (int y = 0; y < size.height; ++y)
+        for (int x = 0; x < size.width; ++x) {
+            const int distance = std::min({x, y, size.width - 1 - x, size.height - 1 - y});
+            distances.row(y)[x] = static_cast<uint8_t>(1 + 254 * distance / scale);
+        }
+    return distances;
+}
+
+// What the first picture's channels are to be multiplied with to be as bright as the second's where both are.
+std::array<float, 3> gains(const Image& first, const Image& ofFirst, const Image& second, const Image& ofSecond) {
+    std::array<double, 3> sumFirst{1, 1, 1}, sumSecond{1, 1, 1};
+    for (int y = 0; y < first->height; ++y)
+        for (int x = 0; x < first->width; ++x)
+            if (ofFirst.row(y)[x] && ofSecond.row(y)[x])
+                for (size_t c = 0; c < 3; ++c) {
+                    sumFirst[c] += first.row(y)[3 * x + static_cast<int>(c)];
+                    sumSecond[c] += second.row(y)[3 * x + static_cast<int>(c)];
+                }
+    std::array<float, 3> gain;
+    for (size_t c = 0; c < 3; ++c)
+        gain[c] = static_cast<float>(std::clamp(sumSecond[c] / sumFirst[c], 0.25, 4.0));
+    return gain;
+}
+
+} // namespace
+
+Image drawKeypoints(const Image& first, const Image& second, const Result& result) {
     Image both = sideBySide(first, second);
     const auto draw = [&](const Feature& f, float left) {
         const float radius = 3 * f.scale;
-        const uint8_t* const c = KEL_COLOR_TABLE_PSEUDO[std::min(63, static_cast<int>(20 * std::log2(f.scale) + 12))];
-        drawCircle(both, left + f.x, f.y, radius, {c[0], c[1], c[2]});
-        drawLine(both, left + f.x, f.y, left + f.x + radius * std::cos(f.angle), f.y + radius * std::sin(f.angle),
-                 {c[0], c[1], c[2]});
+        const Colour colour = colourAt(std::log2(f.scale) / 4);
+        drawCircle(both, left + f.x, f.y, radius, colour);
+        drawLine(both, left + f.x, f.y, left + f.x + radius * std::cos(f.angle), f.y + radius * std::sin(f.angle), colour);
     };
-    for (const Feature& f : ofFirst)
+    for (const Feature& f : result.first)
         draw(f, 0);
-    for (const Feature& f : ofSecond)
+    for (const Feature& f : result.second)
         draw(f, static_cast<float>(first->width));
     return both;
 }
 
-Image drawMatches(const Image& first, const Image& second, const std::vector<Feature>& ofFirst,
-                  const std::vector<Feature>& ofSecond, const std::vector<Match>& matches, const std::vector<bool>& inlier) {
-    constexpr size_t kMost = 60; // of either kind: hundreds of lines would hide the pictures
+Image drawMatches(const Image& first, const Image& second, const Result& result) {
+    constexpr int kInliers = 60, kOthers = 25;
     Image both = sideBySide(first, second);
-    for (const bool pass : {false, true}) { // inliers over the others
-        const size_t all = static_cast<size_t>(std::count(inlier.begin(), inlier.end(), pass)), shown = std::min(all, kMost);
-        for (size_t i = 0, seen = 0; i < matches.size(); ++i) {
-            if (inlier[i] != pass)
-                continue;
-            ++seen;
-            if (seen * shown / all > (seen - 1) * shown / all) { // evenly from first to last
-                const Feature &a = ofFirst[matches[i].first], &b = ofSecond[matches[i].second];
-                const Colour colour = pass ? Colour{0, 230, 60} : Colour{230, 40, 40};
-                drawLine(both, a.x, a.y, static_cast<float>(first->width) + b.x, b.y, colour);
+    for (int i = 0; i < both->size; ++i)
+        both->data[i] = static_cast<uint8_t>(both->data[i] * 3 / 4); // so that the lines stand out
+    const float left = static_cast<float>(first->width), width = static_cast<float>(first->width);
+    for (const bool inliers : {false, true}) // inliers over the others
+        for (const Match* match : spreadOut(result, sizeOf(first), inliers, inliers ? kInliers : kOthers)) {
+            const Feature &a = result.first[match->first], &b = result.second[match->second];
+            const Colour colour = inliers ? colourAt(a.x / width) : Colour{120, 120, 120};
+            drawLine(both, a.x, a.y, left + b.x, b.y, colour);
+            for (const float radius : {3.0f, 4.0f}) {
+                drawCircle(both, a.x, a.y, radius, colour);
+                drawCircle(both, left + b.x, b.y, radius, colour);
             }
         }
-    }
     return both;
 }
 
 Image drawMosaic(const Image& first, const Image& second, const kelMat& H) {
-    constexpr float kMostTimes = 3; // a strong perspective may throw a corner far away: the canvas ends here
-    float left = 0, top = 0, right = static_cast<float>(second->width), bottom = static_cast<float>(second->height);
-    const float limitX = kMostTimes * right, limitY = kMostTimes * bottom;
-    kelMat forward = H;
-    for (const float x : {0.0f, static_cast<float>(first->width - 1)})
-        for (const float y : {0.0f, static_cast<float>(first->height - 1)}) {
-            float u, v;
-            forward.cvtPoint(x, y, &u, &v);
-            left = std::min(left, std::max(u, -limitX));
-            top = std::min(top, std::max(v, -limitY));
-            right = std::max(right, std::min(u + 1, limitX));
-            bottom = std::max(bottom, std::min(v + 1, limitY));
-        }
-    const int shiftX = static_cast<int>(std::ceil(-left)), shiftY = static_cast<int>(std::ceil(-top));
-    const Size size = {static_cast<int>(right) + shiftX, static_cast<int>(bottom) + shiftY};
+    const Canvas canvas(first, second, H);
     kelMat shift(3, 3, true);
     shift.setDataIdentity(1);
-    shift[0][2] = static_cast<float>(shiftX);
-    shift[1][2] = static_cast<float>(shiftY);
-
-    Image canvas(size.width, size.height, KEL_PIXEL_TYPE_U8ZYX);
-    clearKelImage(canvas.get());
-    place(canvas, second, shiftX, shiftY);
-    // A white picture warped alike tells where the first one lies.
-    Image white(first->width, first->height, KEL_PIXEL_TYPE_U8ZYX);
-    std::memset(white->data, 255, static_cast<size_t>(white->size));
-    const Image warped = warpPicture(first, shift * H, size), covered = warpPicture(white, shift * H, size);
-    for (int y = 0; y < size.height; ++y)
-        for (int x = 0; x < size.width; ++x) {
-            if (!*pixelAt(covered, x, y))
+    shift[0][2] = static_cast<float>(canvas.left);
+    shift[1][2] = static_cast<float>(canvas.top);
+    const Image a = warpPicture(first, shift * H, canvas.size),
+                ofA = warpPicture(distancesToEdge(sizeOf(first)), shift * H, canvas.size);
+    const Image ofB = warpPicture(distancesToEdge(sizeOf(second)), shift, canvas.size);
+    Image mosaic(canvas.size.width, canvas.size.height, KEL_PIXEL_TYPE_U8ZYX);
+    clearKelImage(mosaic.get());
+    place(mosaic, second, canvas.left, canvas.top);
+    const std::array<float, 3> gain = gains(a, ofA, mosaic, ofB);
+    for (int y = 0; y < canvas.size.height; ++y)
+        for (int x = 0; x < canvas.size.width; ++x) {
+            const float weightA = ofA.row(y)[x], weightB = ofB.row(y)[x];
+            if (weightA == 0)
                 continue;
-            const bool both = x >= shiftX && y >= shiftY && x < shiftX + second->width && y < shiftY + second->height;
-            const uint8_t* const from = pixelAt(warped, x, y);
-            uint8_t* const to = pixelAt(canvas, x, y);
-            for (int c = 0; c < 3; ++c)
-                to[c] = both ? static_cast<uint8_t>((to[c] + from[c] + 1) / 2) : from[c];
+            for (int c = 0; c < 3; ++c) {
+                uint8_t& to = mosaic.row(y)[3 * x + c];
+                const float evened = std::min(255.0f, gain[static_cast<size_t>(c)] * a.row(y)[3 * x + c]);
+                to = static_cast<uint8_t>((weightA * evened + weightB * to) / (weightA + weightB) + 0.5f);
+            }
         }
-    return canvas;
+    return mosaic;
 }
 
 } // namespace kel_examples

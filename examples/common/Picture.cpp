@@ -1,4 +1,4 @@
-// Decoding and encoding on libpng and libjpeg; PGM and PPM by hand.
+// Decoding and encoding on libpng, libjpeg and libexif; PGM and PPM by hand.
 #include "Picture.h"
 
 #include <algorithm>
@@ -6,13 +6,16 @@
 #include <cerrno>
 #include <csetjmp>
 #include <cstdio>
+#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <jpeglib.h>
+#include <libexif/exif-data.h>
 #include <new>
 #include <png.h>
 #include <utility>
 #include <vector>
+#include <zlib.h>
 
 namespace kel_examples {
 
@@ -107,6 +110,37 @@ bool decodeJpegInto(const uint8_t* bytes, size_t size, const std::string& name, 
     return true;
 }
 
+// How the camera was held, 1 .. 8 as EXIF counts; 1, upright, where the file does not say.
+int orientationOf(const uint8_t* bytes, size_t size) {
+    const std::unique_ptr<ExifData, void (*)(ExifData*)> exif(exif_data_new_from_data(bytes, static_cast<unsigned>(size)),
+                                                              exif_data_unref);
+    const ExifEntry* const entry = exif ? exif_content_get_entry(exif->ifd[EXIF_IFD_0], EXIF_TAG_ORIENTATION) : nullptr;
+    if (!entry || entry->format != EXIF_FORMAT_SHORT || entry->components < 1)
+        return 1;
+    const int orientation = exif_get_short(entry->data, exif_data_get_byte_order(exif.get()));
+    return orientation >= 1 && orientation <= 8 ? orientation : 1;
+}
+
+Image transposed(const Image& image) {
+    Image result(image->height, image->width, image->type);
+    for (int y = 0; y < result->height; ++y)
+        for (int x = 0; x < result->width; ++x)
+            std::copy_n(image.row(x) + 3 * y, 3, result.row(y) + 3 * x);
+    return result;
+}
+
+// From 5 on rows and columns have changed places; within each four the picture is as it is, mirrored, turned by half, upside down.
+Image upright(Image image, int orientation) {
+    if (orientation > 4)
+        image = transposed(image);
+    const int flip = (orientation - 1) % 4;
+    if (flip == 0)
+        return image;
+    Image result(image->width, image->height, image->type);
+    (flip == 1 ? rotateKelImageH : flip == 2 ? rotateKelImageVH : rotateKelImageV)(result.get(), image.get());
+    return result;
+}
+
 Image decodeJpeg(const uint8_t* bytes, size_t size, const std::string& name) {
     JpegErrors errors;
     Image image;
@@ -116,7 +150,7 @@ Image decodeJpeg(const uint8_t* bytes, size_t size, const std::string& name) {
             throw Error(refusal);
         fail(name, std::string("not a readable JPEG file: ") + errors.text);
     }
-    return image;
+    return upright(std::move(image), orientationOf(bytes, size));
 }
 
 // A number of a PGM or PPM header, after blanks and comments.
@@ -221,19 +255,81 @@ Image readPicture(const std::string& path) {
     }
 }
 
+std::vector<uint8_t> encodeJpeg(const Image& image) {
+    constexpr int kQuality = 85;
+    JpegErrors errors;
+    jpeg_compress_struct jpeg;
+    unsigned char* buffer = nullptr;
+    unsigned long size = 0;
+    jpeg.err = jpeg_std_error(&errors);
+    errors.error_exit = leaveJpeg;
+    if (setjmp(errors.leave)) {
+        jpeg_destroy_compress(&jpeg);
+        std::free(buffer);
+        throw Error(std::string("a picture cannot be encoded: ") + errors.text);
+    }
+    jpeg_create_compress(&jpeg);
+    jpeg_mem_dest(&jpeg, &buffer, &size);
+    jpeg.image_width = static_cast<JDIMENSION>(image->width);
+    jpeg.image_height = static_cast<JDIMENSION>(image->height);
+    jpeg.input_components = 3;
+    jpeg.in_color_space = JCS_RGB;
+    jpeg_set_defaults(&jpeg);
+    jpeg_set_quality(&jpeg, kQuality, TRUE);
+    jpeg_start_compress(&jpeg, TRUE);
+    while (jpeg.next_scanline < jpeg.image_height) {
+        JSAMPROW row = image->data + size_t(3) * image->step * jpeg.next_scanline;
+        jpeg_write_scanlines(&jpeg, &row, 1);
+    }
+    jpeg_finish_compress(&jpeg);
+    jpeg_destroy_compress(&jpeg);
+    std::vector<uint8_t> bytes(buffer, buffer + size);
+    std::free(buffer);
+    return bytes;
+}
+
+namespace {
+
+// libpng's own fast settings search for repeats, which photographs do not have: differences from the row above and runs of them cost
+// a third of the time. Between setjmp and longjmp no object with a destructor is made: `bytes` lives outside.
+bool encodePngInto(std::vector<uint8_t>& bytes, const Image& image) {
+    png_structp png = png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, nullptr, nullptr);
+    png_infop info = png ? png_create_info_struct(png) : nullptr;
+    if (!info || setjmp(png_jmpbuf(png))) {
+        png_destroy_write_struct(&png, &info);
+        return false;
+    }
+    png_set_write_fn(
+        png, &bytes,
+        [](png_structp p, png_bytep data, size_t length) {
+            std::vector<uint8_t>* const to = static_cast<std::vector<uint8_t>*>(png_get_io_ptr(p));
+            to->insert(to->end(), data, data + length);
+        },
+        nullptr);
+    png_set_IHDR(png, info, static_cast<png_uint_32>(image->width), static_cast<png_uint_32>(image->height), 8,
+                 image->type == KEL_PIXEL_TYPE_U8G ? PNG_COLOR_TYPE_GRAY : PNG_COLOR_TYPE_RGB, PNG_INTERLACE_NONE,
+                 PNG_COMPRESSION_TYPE_DEFAULT, PNG_FILTER_TYPE_DEFAULT);
+    png_set_filter(png, PNG_FILTER_TYPE_BASE, PNG_FILTER_UP);
+    png_set_compression_level(png, 1);
+    png_set_compression_strategy(png, Z_RLE);
+    png_set_compression_buffer_size(png, size_t(1) << 20);
+    png_write_info(png, info);
+    for (int y = 0; y < image->height; ++y)
+        png_write_row(png, image.row(y));
+    png_write_end(png, info);
+    png_destroy_write_struct(&png, &info);
+    return true;
+}
+
+} // namespace
+
 void writePicture(const std::string& path, const Image& image) {
-    png_image png{};
-    png.version = PNG_IMAGE_VERSION;
-    png.width = static_cast<png_uint_32>(image->width);
-    png.height = static_cast<png_uint_32>(image->height);
-    png.format = image->type == KEL_PIXEL_TYPE_U8G ? PNG_FORMAT_GRAY : PNG_FORMAT_RGB;
-    png.flags = PNG_IMAGE_FLAG_FAST;
-    png_alloc_size_t size = PNG_IMAGE_PNG_SIZE_MAX(png);
-    const std::unique_ptr<uint8_t[]> bytes(new uint8_t[size]);
-    if (!png_image_write_to_memory(&png, bytes.get(), &size, 0, image->data, image->channels * image->step, nullptr))
-        fail(path, std::string("cannot be encoded: ") + png.message);
+    std::vector<uint8_t> bytes;
+    bytes.reserve(static_cast<size_t>(image->size));
+    if (!encodePngInto(bytes, image))
+        fail(path, "cannot be encoded");
     Output file(path);
-    file.write(bytes.get(), size);
+    file.write(bytes.data(), bytes.size());
     file.finish();
 }
 

@@ -5,7 +5,7 @@
 #include <cmath>
 #include <random>
 
-#include "Registration.h"
+#include "Warp.h"
 
 namespace kel_examples {
 

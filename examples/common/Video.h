@@ -9,7 +9,7 @@
 
 #include "Output.h"
 #include "Picture.h"
-#include "Registration.h"
+#include "Warp.h"
 
 namespace kel_examples {
 

@@ -13,8 +13,8 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-#include "common/Registration.h"
 #include "common/Scene.h"
+#include "common/Warp.h"
 
 namespace {
 
@@ -139,8 +139,57 @@ TEST_F(Programs, RegisterRendersAndRegistersASceneTheSameForEqualSeeds) {
         ASSERT_NE(at, std::string::npos);
         EXPECT_LT(std::stod(first.out.substr(at + 7)), 0.5);
     }
+    EXPECT_FALSE(fs::exists(path("kel-out")));
+    const Outcome shown = run("register", "--output kel-out");
+    EXPECT_THAT(shown.out, HasSubstr("\nwrote kel-out/report.html\nwrote kel-out/keypoints.png\n"));
     for (const char* name : {"keypoints", "matches", "warped", "mosaic"})
         EXPECT_NO_THROW(readPicture(path(std::string("kel-out/") + name + ".png"))) << name;
+    const std::string page = contents(path("kel-out/report.html"));
+    EXPECT_EQ(page.find("http"), std::string::npos) << "the page needs a network";
+    for (const char* part : {"id=\"swipe\"", "id=\"blink\"", "--output kel-out", "patches agree", "data:image/jpeg;base64,"})
+        EXPECT_THAT(page, HasSubstr(part));
+}
+
+TEST_F(Programs, RegisterPrintsEverythingAsJson) {
+    const Scene scene = renderScene(2);
+    writePicture(path("a.png"), scene.first);
+    writePicture(path("b.png"), scene.second);
+    const std::string query = "import json, sys; d = json.load(sys.stdin); f = d['first'] + d['second']; "
+                              "print(d['found'], d['reason'], d['homography'] and len(d['homography']), d['share'] > 0.9, "
+                              "d['matches'][0]['first'] < len(d['first']), {len(x['descriptor']) for x in f})";
+    write("query.py", query);
+    EXPECT_EQ(run("register", "a.png b.png --json | python3 query.py").out, "True  9 True True {256}\n");
+    const std::string refused =
+        run("register", "a.png a.png --threshold 0.1 --features 50 --no-views --working-size 200 --json").out;
+    EXPECT_THAT(refused, HasSubstr("\"found\": "));
+}
+
+// The same picture, held in each of the eight ways that EXIF knows.
+TEST_F(Programs, PicturesAreTurnedAsTheirExifOrientationSays) {
+    const Image picture = renderScene(4).first;
+    writeJpeg("plain.jpg", picture);
+    const Image plain = readPicture(path("plain.jpg"));
+    const std::string jpeg = contents(path("plain.jpg"));
+    for (int orientation = 0; orientation <= 9; ++orientation) {
+        const std::string exif = std::string("\xff\xe1\0\x22"
+                                             "Exif\0\0MM\0\x2a\0\0\0\x08\0\x01\x01\x12\0\x03\0\0\0\x01\0",
+                                             29) +
+                                 static_cast<char>(orientation) + std::string(6, '\0');
+        write("turned.jpg", jpeg.substr(0, 2) + exif + jpeg.substr(2));
+        const Image turned = readPicture(path("turned.jpg"));
+        const bool swapped = orientation >= 5 && orientation <= 8;
+        ASSERT_EQ(turned->width, swapped ? plain->height : plain->width) << orientation;
+        const int right = turned->width - 1, down = turned->height - 1;
+        // Where the stored picture's first pixel and the last of its first row come to lie.
+        const int places[10][4] = {{0, 0, right, 0},       {0, 0, right, 0}, {right, 0, 0, 0},        {right, down, 0, down},
+                                   {0, down, right, down}, {0, 0, 0, down},  {right, 0, right, down}, {right, down, right, 0},
+                                   {0, down, 0, 0},        {0, 0, right, 0}};
+        const int* const place = places[orientation];
+        for (int c = 0; c < 3; ++c) {
+            EXPECT_EQ(turned.row(place[1])[3 * place[0] + c], plain.row(0)[c]) << orientation;
+            EXPECT_EQ(turned.row(place[3])[3 * place[2] + c], plain.row(0)[3 * (plain->width - 1) + c]) << orientation;
+        }
+    }
 }
 
 TEST_F(Programs, RegisterReadsEveryFormat) {
@@ -193,11 +242,15 @@ TEST_F(Programs, RegisterSaysWhereThereIsNoHomography) {
     clearKelImage(tiny.get());
     writePicture(path("tiny.png"), tiny);
     for (const char* second : {"b.png", "blank.png", "tiny.png"}) {
-        const Outcome result = run("register", std::string("a.png ") + second);
+        fs::create_directory(path("kel-out"));
+        write("kel-out/mosaic.png", "of an earlier run");
+        const Outcome result = run("register", std::string("a.png ") + second + " --output kel-out");
         EXPECT_EQ(result.status, 2) << second;
         EXPECT_EQ(result.out, "");
         EXPECT_THAT(result.err, HasSubstr("no reliable homography"));
         EXPECT_FALSE(fs::exists(path("kel-out/mosaic.png")));
+        EXPECT_THAT(contents(path("kel-out/report.html")), HasSubstr("No reliable homography: "));
+        EXPECT_NO_THROW(readPicture(path("kel-out/matches.png")));
     }
 }
 
@@ -433,7 +486,7 @@ TEST_F(Programs, WriteIntoWhatIsNoRegularFileAndThroughLinks) {
 
     fs::create_directory(path("kel-out"));
     fs::create_symlink("../mosaic", path("kel-out/mosaic.png"));
-    EXPECT_EQ(run("register", "").status, 0);
+    EXPECT_EQ(run("register", "--output kel-out").status, 0);
     EXPECT_TRUE(fs::is_symlink(path("kel-out/mosaic.png")));
     EXPECT_NO_THROW(readPicture(path("mosaic")));
     for (const auto& entry : fs::recursive_directory_iterator(m_folder))
