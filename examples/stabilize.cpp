@@ -5,6 +5,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <iostream>
+#include <memory>
+#include <utility>
 #include <vector>
 
 #include <kel/kelRegister.h>
@@ -17,7 +19,7 @@ using namespace kel_examples;
 
 namespace {
 
-constexpr int kMostFeatures = 300;
+constexpr int kMostFeatures = 240;
 constexpr float kThreshold = 2;    // pixels of the halved picture that features are taken from
 constexpr float kFollow = 0.06f;   // share of the way back to the frame as it is, per frame
 constexpr float kFarthest = 0.15f; // of the picture's width that a correction may move a corner where nothing is cut off
@@ -102,18 +104,19 @@ public:
         if (half->width < 2 || half->height < 2)
             return;
         resizeKelImageHalf(half.get(), luma.get());
+        kelRegister::Options options;
+        options.threshold = kThreshold;
+        options.mostFeatures = kMostFeatures;
+        options.views = false;
+        kelRegister::Prepared now(half.get(), options);
         if (m_before) {
-            kelRegister::Options options;
-            options.threshold = kThreshold;
-            options.mostFeatures = kMostFeatures;
-            options.views = false;
-            const kelRegister::Result motion = kelRegister::registerPictures(half.get(), m_before.get(), options);
+            const kelRegister::Result motion = kelRegister::registerPictures(now, *m_before, options);
             if (motion.found)
                 follow(m_correction * fullSize(motion.H));
             else
                 m_correction.setDataIdentity(1); // a cut: start anew
         }
-        m_before = std::move(half);
+        m_before.reset(new kelRegister::Prepared(std::move(now)));
     }
 
 private:
@@ -149,7 +152,7 @@ private:
     Size m_size;
     float m_farthest; // pixels that a correction may move a corner
     kelMat m_correction;
-    Image m_before; // halved
+    std::unique_ptr<kelRegister::Prepared> m_before; // halved
 };
 
 int stabilize(const Options& options) {

@@ -1,6 +1,7 @@
 // The calls of the interface: what they accept, the order of the stages, and the verdict.
 #include <algorithm>
 #include <cmath>
+#include <utility>
 
 #include "kelRegister_Private.h"
 
@@ -16,9 +17,10 @@ constexpr double kViewMargin = 6;      // working pixels from the edge
 constexpr int kViewFeatures = 500;     // keypoints of a squeezed view
 constexpr double kSupportReach = 0.2;  // of the first picture's diagonal
 constexpr double kSupportSlack = 3;    // working pixels of the second
+constexpr int kMostPatches = 600;      // that are compared; fewer where few features are asked for
 constexpr int kLeastMatches = 5;       // to try a fit on
 
-std::string whyUnusable(const Options& options) {
+std::string whyWrong(const Options& options) {
     if (!(options.threshold >= 0.1f && options.threshold <= 100))
         return "the threshold is not between 0.1 and 100 pixels";
     if (options.mostFeatures < 50 || options.mostFeatures > 5000)
@@ -36,28 +38,47 @@ Point pointOf(const Feature& f) {
     return {f.x, f.y};
 }
 
-// Both pictures on their way through the stages.
+// A picture on its way through the stages, or why it is not.
+struct Ready {
+    std::string reason;
+    Pyramid pyramid;
+    std::vector<Feature> features;
+    int mostFeatures = 0;
+
+    Ready(const kelImage_t* picture, const char* name, const Options& options) {
+        reason = whyWrong(options);
+        if (reason.empty())
+            reason = whyUnusable(picture, name);
+        if (!reason.empty())
+            return;
+        pyramid = makePyramid(greyOf(picture), options.workingSize);
+        features = findFeatures(pyramid, options.mostFeatures);
+        mostFeatures = options.mostFeatures;
+    }
+};
+
+// From matching to the verdict.
 class Registration {
 public:
-    Registration(const kelImage_t* first, const kelImage_t* second, const Options& options, Result& result)
-        : m_options(options), m_result(result), m_first(makePyramid(greyOf(first), options.workingSize)),
-          m_second(makePyramid(greyOf(second), options.workingSize)) {}
+    Registration(const Ready& first, const Ready& second, const Options& options, Result& result)
+        : m_options(options), m_result(result), m_readyFirst(first), m_readySecond(second), m_first(first.pyramid),
+          m_second(second.pyramid) {}
 
     void run() {
-        m_result.first = findFeatures(m_first, m_options.mostFeatures);
-        m_result.second = findFeatures(m_second, m_options.mostFeatures);
+        m_result.first = m_readyFirst.features;
+        m_result.second = m_readySecond.features;
         if (!attempt() && m_options.views) {
-            addViews(m_first, m_result.first);
-            addViews(m_second, m_result.second);
+            addViews(m_first, std::min(kViewFeatures, m_readyFirst.mostFeatures), m_result.first);
+            addViews(m_second, std::min(kViewFeatures, m_readySecond.mostFeatures), m_result.second);
             attempt();
         }
     }
 
 private:
-    void addViews(const Pyramid& picture, std::vector<Feature>& features) const {
+    static void addViews(const Pyramid& picture, int most, std::vector<Feature>& features) {
         for (int eighths = 0; eighths < kViews; ++eighths) {
             const View view = makeView(picture, eighths);
-            for (Feature f : findFeatures(view.pyramid, std::min(kViewFeatures, m_options.mostFeatures))) {
+            for (Feature f : findFeatures(view.pyramid, most)) {
                 const Point place = view.toPicture.at(pointOf(f));
                 f.x = static_cast<float>(place.x);
                 f.y = static_cast<float>(place.y);
@@ -98,7 +119,9 @@ private:
         Map H;
         if (!fitRobustly(some, all, bound(), H))
             return refuse("no plausible homography among " + std::to_string(some.size()) + " matches");
-        const Judgement judgement = refine(m_first, m_second, r.first, r.second, std::min(m_options.threshold, 3.0f), H);
+        const int patches = std::min(kMostPatches, std::min(m_readyFirst.mostFeatures, m_readySecond.mostFeatures) / 2);
+        const Judgement judgement =
+            refine(m_first, m_second, r.first, r.second, std::min(m_options.threshold, 3.0f), patches, H);
         r.tested = judgement.tested;
         r.agreeing = judgement.agreeing;
         r.share = static_cast<float>(judgement.share());
@@ -131,32 +154,48 @@ private:
 
     const Options& m_options;
     Result& m_result;
-    const Pyramid m_first, m_second;
+    const Ready &m_readyFirst, &m_readySecond;
+    const Pyramid &m_first, &m_second;
 };
 
-} // namespace
-
-std::vector<Feature> findFeatures(const kelImage_t* picture, const Options& options, std::string* reason) {
-    std::string why = whyUnusable(options);
-    if (why.empty())
-        why = whyUnusable(picture, "given");
-    if (why.empty())
-        return findFeatures(makePyramid(greyOf(picture), options.workingSize), options.mostFeatures);
-    if (reason)
-        *reason = why;
-    return std::vector<Feature>();
-}
-
-Result registerPictures(const kelImage_t* first, const kelImage_t* second, const Options& options) {
+Result registered(const Ready& first, const Ready& second, const Options& options) {
     Result result;
-    result.reason = whyUnusable(options);
+    result.reason = whyWrong(options);
     if (result.reason.empty())
-        result.reason = whyUnusable(first, "first");
-    if (result.reason.empty())
-        result.reason = whyUnusable(second, "second");
+        result.reason = first.reason.empty() ? second.reason : first.reason;
     if (result.reason.empty())
         Registration(first, second, options, result).run();
     return result;
+}
+
+} // namespace
+
+struct Prepared::Body : Ready {
+    using Ready::Ready;
+};
+
+Prepared::Prepared(const kelImage_t* picture, const Options& options) : m_body(new Body(picture, "given", options)) {}
+Prepared::Prepared(Prepared&& other) noexcept = default;
+Prepared& Prepared::operator=(Prepared&& other) noexcept = default;
+Prepared::~Prepared() = default;
+
+const std::string& Prepared::reason() const {
+    return m_body->reason;
+}
+
+Result registerPictures(const Prepared& first, const Prepared& second, const Options& options) {
+    return registered(*first.m_body, *second.m_body, options);
+}
+
+std::vector<Feature> findFeatures(const kelImage_t* picture, const Options& options, std::string* reason) {
+    Ready ready(picture, "given", options);
+    if (reason && !ready.reason.empty())
+        *reason = ready.reason;
+    return std::move(ready.features);
+}
+
+Result registerPictures(const kelImage_t* first, const kelImage_t* second, const Options& options) {
+    return registered(Ready(first, "first", options), Ready(second, "second", options), options);
 }
 
 } // namespace kelRegister

@@ -16,6 +16,7 @@
 
 #include <kel/kelImage.h>
 #include <kel/kelMat.h>
+#include <memory>
 #include <string>
 #include <vector>
 
@@ -101,6 +102,28 @@ KEL_API std::vector<Match> matchFeatures(const std::vector<Feature>& first, cons
  * The same types as findFeatures(); the two may differ in type and size. Neither picture may be null.
  */
 KEL_API Result registerPictures(const kelImage_t* first, const kelImage_t* second, const Options& options = Options());
+
+/**
+ * A picture made ready once for several registrations: its levels and its features, which take half of the time. A video registers
+ * every frame to the one before and moves it along. Nothing of the picture itself is kept, nor pointed to.
+ */
+class Prepared {
+public:
+    KEL_API explicit Prepared(const kelImage_t* picture, const Options& options = Options());
+    KEL_API Prepared(Prepared&& other) noexcept;
+    KEL_API Prepared& operator=(Prepared&& other) noexcept;
+    KEL_API ~Prepared();
+    /** Why the picture or an option cannot be used; empty otherwise. */
+    KEL_API const std::string& reason() const;
+
+private:
+    friend Result registerPictures(const Prepared& first, const Prepared& second, const Options& options);
+    struct Body;
+    std::unique_ptr<Body> m_body;
+};
+
+/** As registerPictures() on the two pictures, each prepared with its own options; of these here, threshold and views count. */
+KEL_API Result registerPictures(const Prepared& first, const Prepared& second, const Options& options = Options());
 
 } // namespace kelRegister
 

@@ -10,7 +10,6 @@ namespace kelRegister {
 
 namespace {
 
-constexpr int kMostPatches = 600;
 constexpr int kReachCoarse = 6, kReachFine = 5; // level pixels either way
 constexpr int kMostReach = 6;
 constexpr int kRounds = 4;
@@ -217,6 +216,7 @@ struct Refinement {
     std::vector<Point> places; // of the coarser one
     double growth;             // finer pixels to a coarser one
     double threshold;          // working pixels
+    size_t mostPatches;
     Map toFine;
 
     // The levels that meet at a scale of the coarser picture.
@@ -241,7 +241,7 @@ struct Refinement {
     std::vector<Pair> search(const Meeting& meeting, int reach, int& tested) const {
         std::vector<Pair> pairs;
         const Level& level = meeting.from;
-        const size_t count = std::min<size_t>(places.size(), kMostPatches);
+        const size_t count = std::min(places.size(), mostPatches);
         for (size_t i = 0; i < count; ++i) {
             const Point place = places[i * places.size() / count];
             const int left = meeting.start(place.x), top = meeting.start(place.y);
@@ -323,7 +323,7 @@ struct Refinement {
 } // namespace
 
 Judgement refine(const Pyramid& first, const Pyramid& second, const std::vector<Feature>& ofFirst,
-                 const std::vector<Feature>& ofSecond, double threshold, Map& H) {
+                 const std::vector<Feature>& ofSecond, double threshold, int mostPatches, Map& H) {
     double area = 0;
     std::vector<Point> places = placesInside(ofFirst, H, second, area);
     if (!(area > 0))
@@ -337,7 +337,9 @@ Judgement refine(const Pyramid& first, const Pyramid& second, const std::vector<
             return Judgement();
     }
     const Pyramid& coarse = firstIsCoarse ? first : second;
-    Refinement r = {coarse, firstIsCoarse ? second : first, std::move(places), std::sqrt(area), threshold, toFine};
+    Refinement r = {
+        coarse, firstIsCoarse ? second : first, std::move(places), std::sqrt(area), threshold, static_cast<size_t>(mostPatches),
+        toFine};
 
     Judgement judgement;
     const double working = coarse.workingScale;

@@ -135,9 +135,9 @@ struct Judgement {
     double share() const { return tested ? static_cast<double>(agreeing) / tested : 0; }
 };
 
-// Fits H anew to where patches about the keypoints of the coarser picture are found in the other one.
+// Fits H anew to where at most so many patches about the keypoints of the coarser picture are found in the other one.
 Judgement refine(const Pyramid& first, const Pyramid& second, const std::vector<Feature>& ofFirst,
-                 const std::vector<Feature>& ofSecond, double threshold, Map& H);
+                 const std::vector<Feature>& ofSecond, double threshold, int mostPatches, Map& H);
 
 // ---- kelRegisterTrust.cpp ----
 

@@ -127,6 +127,21 @@ TEST(Register, TheSameSeedGivesTheSameBits) {
     EXPECT_EQ(a.H.m_Data[8], 1);
 }
 
+TEST(Register, PreparedPicturesGiveTheSameBits) {
+    Plane H;
+    const Image view = warped(scene().get(), {1.3, 40, 30, 0.9}, 1000, H), tiny(7, 7, KEL_PIXEL_TYPE_U8G);
+    std::srand(3);
+    const Result expected = registerPictures(scene().get(), view.get());
+    kelRegister::Prepared first(scene().get()), moved(std::move(first)), second(view.get()), small(tiny.get());
+    std::srand(3);
+    const Result r = registerPictures(moved, second);
+    ASSERT_TRUE(r.found && expected.found);
+    EXPECT_EQ(std::memcmp(r.H.m_Data, expected.H.m_Data, 9 * sizeof(float)), 0);
+    EXPECT_TRUE(second.reason().empty());
+    EXPECT_EQ(registerPictures(moved, small).reason, small.reason());
+    EXPECT_EQ(small.reason(), "the given picture is too small: 7 x 7 pixels, at least 40 either way are needed");
+}
+
 // Grey values alone count, and padding does not.
 TEST(Register, AllTypesOfOnePictureGiveTheSame) {
     Plane H;
