@@ -346,22 +346,16 @@ KEL_API void convertKelImageSSE_U8YUV_to_U8BGR(kelImage_t* dst, const kelImage_t
 KEL_API void convertKelImageSSE_U8YUV_to_U8RGB(kelImage_t* dst, const kelImage_t* src);
 /** @} */
 
-#ifdef __cplusplus
-}
-#endif
 /**
  * Reverses the channels and adds alpha: (s2, s1, s0, 0), as the portable converters do it. No route of convertKelImage() comes
  * here. Its symbol carries the parameter types, for C callers too.
  */
 #ifdef __cplusplus
-KEL_API void convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src);
+extern "C++" KEL_API void convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src);
 #else
 KEL_API void
 convertKelImage_U8XYZ_to_U8ZYXA(kelImage_t* dst,
                                 const kelImage_t* src) __asm__("_Z31convertKelImage_U8XYZ_to_U8ZYXAP11kelImage_t_PKS_");
-#endif
-#ifdef __cplusplus
-extern "C" {
 #endif
 
 /* ------------------------------------------------------------------------------------------------------------------

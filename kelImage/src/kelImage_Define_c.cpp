@@ -1,6 +1,6 @@
 // Random integers over the platform's rand(); seeding it is the application's business.
-#include <stdint.h>
-#include <stdlib.h>
+#include <cstdint>
+#include <cstdlib>
 
 #include "kelAssert.h"
 #include "kelImage.h"

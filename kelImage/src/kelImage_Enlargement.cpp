@@ -1,6 +1,6 @@
 // Linear enlargement of four-byte pixels, weights in 1/256: rows across, as many as are needed, then two of them mixed.
 #include <algorithm>
-#include <string.h>
+#include <cstring>
 
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"

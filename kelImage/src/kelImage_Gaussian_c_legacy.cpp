@@ -1,6 +1,6 @@
 // Gaussian 5x5: weights (1, 4, 6, 4, 1) / 16 both ways, rounded once; and the names that lead to the 7x7.
 // Rests on the row helpers and on kernels that do a row, its zero ends included.
-#include <string.h>
+#include <cstring>
 
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"
@@ -51,7 +51,7 @@ void applyKelFilterGaussian5X5_downsampling(kelImage_t* dst, kelImage_t* half, k
 }
 
 void applyKelFilterGaussian5X5(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp) {
-    applyKelFilterGaussian5X5_downsampling(dst, NULL, src, tmp);
+    applyKelFilterGaussian5X5_downsampling(dst, nullptr, src, tmp);
 }
 
 void applyKelFilterGaussian7X7_downsampling(kelImage_t* dst, kelImage_t* half, kelImage_t* src, kelImage_t* tmp) {
@@ -59,7 +59,7 @@ void applyKelFilterGaussian7X7_downsampling(kelImage_t* dst, kelImage_t* half, k
 }
 
 void applyKelFilterGaussian7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp) {
-    applyKelFilterGaussian7X7_downsampling(dst, NULL, src, tmp);
+    applyKelFilterGaussian7X7_downsampling(dst, nullptr, src, tmp);
 }
 
 } // extern "C"

@@ -61,7 +61,7 @@ void applyKelFilterGaussianSSE7X7_downsampling(kelImage_t* dst, kelImage_t* half
 }
 
 void applyKelFilterGaussianSSE7X7(kelImage_t* dst, kelImage_t* src, kelImage_t* tmp) {
-    applyKelFilterGaussianSSE7X7_downsampling(dst, NULL, src, tmp);
+    applyKelFilterGaussianSSE7X7_downsampling(dst, nullptr, src, tmp);
 }
 
 } // extern "C"

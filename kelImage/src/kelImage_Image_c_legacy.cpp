@@ -1,7 +1,7 @@
 // Life cycle of an image, and the way of pixels in and out of it through the caller's memory.
 #include <algorithm>
-#include <stdlib.h>
-#include <string.h>
+#include <cstdlib>
+#include <cstring>
 
 #include "kelImage_Private.h"
 

@@ -3,8 +3,8 @@
 #ifndef KEL_IMAGE_KERNELS_H
 #define KEL_IMAGE_KERNELS_H
 
-#include <stddef.h>
-#include <stdint.h>
+#include <cstddef>
+#include <cstdint>
 
 namespace kel {
 

@@ -5,9 +5,9 @@
 #ifndef KEL_IMAGE_LANES_SSE41_H
 #define KEL_IMAGE_LANES_SSE41_H
 
+#include <cstddef>
+#include <cstdint>
 #include <immintrin.h>
-#include <stddef.h>
-#include <stdint.h>
 
 namespace {
 

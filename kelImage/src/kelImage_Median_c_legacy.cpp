@@ -1,6 +1,6 @@
 // Rank filter over a square window, one sort a pixel. Rests on the runtime's qsort and the row helpers.
-#include <stdlib.h>
-#include <string.h>
+#include <cstdlib>
+#include <cstring>
 
 #include "kelImage_Private.h"
 

@@ -1,6 +1,6 @@
 // Additive uniform noise, one draw of rand() a pixel. Rests on the row helpers.
 #include <algorithm>
-#include <stdlib.h>
+#include <cstdlib>
 
 #include "kelImage_Private.h"
 

@@ -3,8 +3,8 @@
 #ifndef KEL_IMAGE_PRIVATE_H
 #define KEL_IMAGE_PRIVATE_H
 
-#include <stddef.h>
-#include <stdint.h>
+#include <cstddef>
+#include <cstdint>
 
 #include "kelAssert.h"
 #include "kelImage.h"

@@ -1,5 +1,5 @@
 // Rectangles between two corners (pp1), corner and size (ps1), and centre and size (ps2).
-#include <stdint.h>
+#include <cstdint>
 
 #include "kelImage.h"
 

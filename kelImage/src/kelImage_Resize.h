@@ -2,8 +2,8 @@
 #ifndef KEL_IMAGE_RESIZE_H
 #define KEL_IMAGE_RESIZE_H
 
+#include <cstdlib>
 #include <memory>
-#include <stdlib.h>
 
 #include "kelImage.h"
 

@@ -1,6 +1,6 @@
 // Resizing: checks and the ways to its bodies, and borders, written once over pixels of 1 to 4 bytes.
 #include <algorithm>
-#include <string.h>
+#include <cstring>
 
 #include "kelImage_Private.h"
 #include "kelImage_Resize.h"

@@ -1,5 +1,5 @@
 // Mirror, flip, half turn, and projective warp, over pixels of 1 to 4 bytes.
-#include <string.h>
+#include <cstring>
 
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"

@@ -1,6 +1,6 @@
 // Sampling at whole-number ratios: output x samples source position (x + 0.5) * ratio, in single precision. An enlargement has
 // ratio 0 and samples pixel (0, 0) throughout. Rests on the kernels that take every second pixel or average four.
-#include <string.h>
+#include <cstring>
 
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"

@@ -1,5 +1,5 @@
 // Channels and element bytes of a pixel-type code, 8 x layout + kind.
-#include <stdint.h>
+#include <cstdint>
 
 #include "kelImage_Private.h"
 

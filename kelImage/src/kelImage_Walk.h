@@ -3,7 +3,7 @@
 #ifndef KEL_IMAGE_WALK_H
 #define KEL_IMAGE_WALK_H
 
-#include <string.h>
+#include <cstring>
 
 namespace {
 

@@ -1,10 +1,10 @@
 // The matrix class: storage, arithmetic, points, rotations, decompositions. The iterative kernels are in kelMatAlgorithm.cpp,
 // determinants and inverses in files of their own.
 #include <algorithm>
+#include <cmath>
+#include <cstdio>
+#include <cstdlib>
 #include <emmintrin.h>
-#include <math.h>
-#include <stdio.h>
-#include <stdlib.h>
 
 #include "kelAssert.h"
 #include "kelMat_Private.h"
@@ -431,6 +431,25 @@ float angleOf(float sine, float cosine, double c) {
     return angleOf(clamped(static_cast<float>(sine / c)), clamped(static_cast<float>(cosine / c)));
 }
 
+// Sine and cosine of an angle, or both times one factor.
+struct Turn {
+    float sine, cosine;
+};
+
+// Angles in degrees from the middle one, y, and from x and z with the cosine of y as their factor; where that is zero, x takes both
+// from `locked`.
+void extractAngles(Turn aboutY, Turn aboutX, Turn aboutZ, Turn locked, float& x, float& y, float& z) {
+    const float radY = angleOf(clamped(aboutY.sine), std::min(aboutY.cosine, 1.0f));
+    const double c = cos(static_cast<double>(radY));
+    const bool isLocked = !(c > kGimbalCosine);
+    const float radX =
+        isLocked ? angleOf(clamped(locked.sine), clamped(locked.cosine)) : angleOf(aboutX.sine, aboutX.cosine, c);
+    const float radZ = isLocked ? 0.0f : angleOf(aboutZ.sine, aboutZ.cosine, c);
+    x = degrees(radX);
+    y = degrees(radY);
+    z = degrees(radZ);
+}
+
 // The angle of a sine and cosine that may lie a little outside [-1, 1], tested in this order.
 float saturatedAngleOf(float sine, float cosine) {
     if (cosine > 1.0f)
@@ -450,38 +469,16 @@ float saturatedAngleOf(float sine, float cosine) {
 bool kelMat::getAngleFromRotationMatrix_XYZ_3x3(float& x, float& y, float& z) {
     KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
     const kelMat& R = *this;
-    const float radY = angleOf(clamped(-R[2][0]), std::min(sqrtf(R[2][2] * R[2][2] + R[2][1] * R[2][1]), 1.0f));
-    const double c = cos(static_cast<double>(radY));
-    float radX, radZ;
-    if (c > kGimbalCosine) {
-        radX = angleOf(R[2][1], R[2][2], c);
-        radZ = angleOf(R[1][0], R[0][0], c);
-    } else {
-        radX = angleOf(clamped(-R[1][2]), clamped(R[1][1]));
-        radZ = 0.0f;
-    }
-    x = degrees(radX);
-    y = degrees(radY);
-    z = degrees(radZ);
+    const Turn aboutY = {-R[2][0], sqrtf(R[2][2] * R[2][2] + R[2][1] * R[2][1])};
+    extractAngles(aboutY, {R[2][1], R[2][2]}, {R[1][0], R[0][0]}, {-R[1][2], R[1][1]}, x, y, z);
     return true;
 }
 
 bool kelMat::getAngleFromRotationMatrix_ZYX_3x3(float& x, float& y, float& z) {
     KEL_ASSERT(this->m_Width == 3 && this->m_Height == 3);
     const kelMat& R = *this;
-    const float radY = angleOf(clamped(R[0][2]), std::min(sqrtf(R[0][0] * R[0][0] + R[0][1] * R[0][1]), 1.0f));
-    const double c = cos(static_cast<double>(radY));
-    float radX, radZ;
-    if (c > kGimbalCosine) {
-        radX = angleOf(-R[1][2], R[2][2], c);
-        radZ = angleOf(-R[0][1], R[0][0], c);
-    } else {
-        radX = angleOf(clamped(R[2][1]), clamped(R[1][1]));
-        radZ = 0.0f;
-    }
-    x = degrees(radX);
-    y = degrees(radY);
-    z = degrees(radZ);
+    const Turn aboutY = {R[0][2], sqrtf(R[0][0] * R[0][0] + R[0][1] * R[0][1])};
+    extractAngles(aboutY, {-R[1][2], R[2][2]}, {-R[0][1], R[0][0]}, {R[2][1], R[1][1]}, x, y, z);
     return true;
 }
 

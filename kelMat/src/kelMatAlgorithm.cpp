@@ -1,8 +1,8 @@
 // The numerical kernels behind the matrix class: LU, Cholesky, singular values, symmetric eigenvalues, and the products they
 // need. Every element's own sum runs in the order that the textbook algorithms have, whatever the loops around it look like.
 #include <algorithm>
-#include <float.h>
-#include <math.h>
+#include <cfloat>
+#include <cmath>
 #include <smmintrin.h>
 
 #include "kelMat_Private.h"

@@ -3,7 +3,7 @@
 #ifndef KEL_MAT_INLIER_KERNEL_H
 #define KEL_MAT_INLIER_KERNEL_H
 
-#include <string.h>
+#include <cstring>
 
 #include "kelMatInliers.h"
 

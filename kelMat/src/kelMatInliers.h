@@ -2,7 +2,7 @@
 #ifndef KEL_MAT_INLIERS_H
 #define KEL_MAT_INLIERS_H
 
-#include <stdint.h>
+#include <cstdint>
 
 namespace kel {
 
