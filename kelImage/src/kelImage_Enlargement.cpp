@@ -10,7 +10,6 @@ namespace {
 
 using kel::allocate;
 using kel::Buffer;
-using kel::rowByWidth;
 
 // For every output position the source position and the weight of the next one. At most one source position is stepped per
 // output position.

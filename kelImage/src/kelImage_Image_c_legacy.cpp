@@ -77,13 +77,11 @@ kelImage_t* cloneKelImage(const kelImage_t* src) {
 }
 
 void copyKelImage(kelImage_t* dst, const kelImage_t* src) {
-    if (src->size != 0)
-        memcpy(dst->data, src->data, static_cast<size_t>(src->size));
+    std::copy_n(src->data, src->size, dst->data);
 }
 
 void clearKelImage(kelImage_t* image) {
-    if (image->size != 0)
-        memset(image->data, 0, static_cast<size_t>(image->size));
+    std::fill_n(image->data, image->size, static_cast<unsigned char>(0));
 }
 
 void loadKelImageData(kelImage_t* image, const void* src, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch) {

@@ -9,7 +9,6 @@
 namespace {
 
 using kel::Kernels;
-using kel::row;
 using kel::rowByWidth;
 
 // Below this source size every sample position is exact in single precision, so that integers give the same samples.
