@@ -50,6 +50,7 @@ struct Prediction {
 std::vector<bool> supported(const std::vector<Feature>& first, const std::vector<Feature>& second,
                             const std::vector<Match>& matches, double reach, double slack) {
     std::vector<Prediction> predictions;
+    predictions.reserve(matches.size());
     for (const Match& match : matches)
         predictions.emplace_back(first[match.first], second[match.second]);
     std::vector<bool> marks(matches.size());
