@@ -1,5 +1,6 @@
-// How far registration can be relied on, beside chains of ORB and of SIFT: pairs of photographs with known homographies, exact warps of
-// pictures, and pictures that do not belong together. Prints one row a kind of pair.
+// How far registration can be relied on, beside chains of ORB and of SIFT: pairs of photographs with known homographies, exact
+// warps of pictures, and pictures that do not belong together. Prints a table for Markdown, a row for each kind of pair.
+#include <CLI/CLI.hpp>
 #include <algorithm>
 #include <chrono>
 #include <cmath>
@@ -312,17 +313,20 @@ void measure(const char* name, const Method& method, const Cases& cases, const s
                             answer.found ? "found" : "refused", error, answer.share, time, answer.reason.c_str());
         }
     }
-    std::printf("%-6s %-14s %6s %6s %6s %8s %8s %8s %8s %8s %8s %8s\n", name, "pairs of", "pairs", "found", "wrong", "refused",
-                "median", "most", "ms mean", "ms most", "share >=", "share <=");
+    std::printf(
+        "\n| %s | pairs | found | wrong | refused | median error, px | largest | ms, mean | most | found share | refused share "
+        "|\n|---|---:|---:|---:|---:|---:|---:|---:|---:|---:|---:|\n",
+        name);
     for (const std::string& kind : order) {
         const Row& r = rows[kind];
         double sum = 0;
         for (const double ms : r.milliseconds)
             sum += ms;
-        std::printf("%-6s %-14s %6d %6d %6d %8d %8.3f %8.3f %8.1f %8.1f %8.2f %8.2f\n", name, kind.c_str(), r.pairs, r.found,
-                    r.wrong, r.refused, median(r.errors),
-                    r.errors.empty() ? 0 : *std::max_element(r.errors.begin(), r.errors.end()), sum / r.pairs,
-                    *std::max_element(r.milliseconds.begin(), r.milliseconds.end()), r.leastShare, r.mostShare);
+        const bool any = !r.errors.empty();
+        std::printf("| %s | %d | %d | %d | %d | %.2f | %.2f | %.0f | %.0f | %.2f | %.2f |\n", kind.c_str(), r.pairs, r.found,
+                    r.wrong, r.refused, median(r.errors), any ? *std::max_element(r.errors.begin(), r.errors.end()) : 0,
+                    sum / r.pairs, *std::max_element(r.milliseconds.begin(), r.milliseconds.end()), any ? r.leastShare : 0,
+                    r.mostShare);
     }
     std::fflush(stdout);
 }
@@ -334,26 +338,17 @@ int main(int argc, char** argv) {
     int seeds = 3, warps = 1, strangers = 400, harder = 1;
     bool peers = false, verbose = false;
     std::set<std::string> kinds;
-    for (int i = 1; i < argc; ++i) {
-        const std::string option = argv[i];
-        const auto value = [&] { return option.substr(option.find('=') + 1); };
-        if (option.rfind("--seeds=", 0) == 0)
-            seeds = std::stoi(value());
-        else if (option.rfind("--warps=", 0) == 0)
-            warps = std::stoi(value());
-        else if (option.rfind("--harder=", 0) == 0)
-            harder = std::stoi(value());
-        else if (option.rfind("--strangers=", 0) == 0)
-            strangers = std::stoi(value());
-        else if (option.rfind("--kind=", 0) == 0)
-            kinds.insert(value());
-        else if (option == "--peers")
-            peers = true;
-        else if (option == "--verbose")
-            verbose = true;
-        else
-            folder = option;
-    }
+    CLI::App app("Measures registration and prints a table for Markdown; what kel misses is listed before it.",
+                 "kel_registration_bench");
+    app.add_option("folder", folder, "with pictures NAME1 and NAME2 and their homography NAME1_to_NAME2.txt");
+    app.add_option("--seeds", seeds, "for each pair of photographs")->capture_default_str();
+    app.add_option("--warps", warps, "of each kind for each picture")->capture_default_str();
+    app.add_option("--harder", harder, "variants of each pair of photographs")->capture_default_str();
+    app.add_option("--strangers", strangers, "pairs of pictures that do not belong together")->capture_default_str();
+    app.add_option("--kind", kinds, "only rows of these names");
+    app.add_flag("--peers", peers, "beside chains of ORB and SIFT");
+    app.add_flag("--verbose", verbose, "a line for every pair");
+    CLI11_PARSE(app, argc, argv);
     cv::setNumThreads(1);
     try {
         Cases cases;

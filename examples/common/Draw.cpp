@@ -109,8 +109,8 @@ Colour colourAt(float share) {
     return {c[0], c[1], c[2]};
 }
 
-// A canvas that holds the second picture and the first one's corners; a strong perspective may throw a corner far away, and so the
-// canvas ends at three times the second's size.
+// A canvas that holds the second picture and the first one's corners; a strong perspective may throw a corner far away, and so
+// the canvas ends at three times the second's size.
 struct Canvas {
     int left, top;
     Size size;

@@ -22,11 +22,12 @@ void drawText(Image& picture, int x, int y, const std::string& text, Colour colo
 // Both pictures side by side with their keypoints.
 Image drawKeypoints(const Image& first, const Image& second, const kelRegister::Result& result);
 
-// Both pictures side by side; a sample of the inliers joined, in colours by their place, over a sample of the other matches in grey.
+// Both pictures side by side; a sample of the inliers joined, in colours by their place, over a sample of the other matches in
+// grey.
 Image drawMatches(const Image& first, const Image& second, const kelRegister::Result& result);
 
-// Both on one canvas in the second's frame. Where they overlap the first takes on the second's exposure, and each fades out towards its
-// own edge, so that misregistration shows as ghosts and nothing else as a seam.
+// Both on one canvas in the second's frame. Where they overlap the first takes on the second's exposure, and each fades out
+// towards its own edge, so that misregistration shows as ghosts and nothing else as a seam.
 Image drawMosaic(const Image& first, const Image& second, const kelMat& H);
 
 } // namespace kel_examples

@@ -129,7 +129,8 @@ Image transposed(const Image& image) {
     return result;
 }
 
-// From 5 on rows and columns have changed places; within each four the picture is as it is, mirrored, turned by half, upside down.
+// From 5 on rows and columns have changed places; within each four the picture is as it is, mirrored, turned by half, upside
+// down.
 Image upright(Image image, int orientation) {
     if (orientation > 4)
         image = transposed(image);
@@ -290,8 +291,8 @@ std::vector<uint8_t> encodeJpeg(const Image& image) {
 
 namespace {
 
-// libpng's own fast settings search for repeats, which photographs do not have: differences from the row above and runs of them cost
-// a third of the time. Between setjmp and longjmp no object with a destructor is made: `bytes` lives outside.
+// libpng's own fast settings search for repeats, which photographs do not have: differences from the row above and runs of them
+// cost a third of the time. Between setjmp and longjmp no object with a destructor is made: `bytes` lives outside.
 bool encodePngInto(std::vector<uint8_t>& bytes, const Image& image) {
     png_structp png = png_create_write_struct(PNG_LIBPNG_VER_STRING, nullptr, nullptr, nullptr);
     png_infop info = png ? png_create_info_struct(png) : nullptr;

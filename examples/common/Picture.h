@@ -1,4 +1,5 @@
-// Pictures between files and images: PNG, JPEG (turned as its EXIF orientation says), binary PGM and PPM in; PNG and JPEG out. Every failure is an Error whose text names the file.
+// Pictures between files and images: PNG, JPEG (turned as its EXIF orientation says), binary PGM and PPM in; PNG and JPEG out.
+// Every failure is an Error whose text names the file.
 #ifndef KEL_EXAMPLES_PICTURE_H
 #define KEL_EXAMPLES_PICTURE_H
 

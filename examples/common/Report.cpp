@@ -28,7 +28,8 @@ img { max-width: 100%; display: block }
 // The slider moves the border between the two pictures; blinking shows each for half a second.
 const char* const kScript = R"(<script>
 const over = document.getElementById('over'), line = document.getElementById('line');
-const swipe = document.getElementById('swipe'), blink = document.getElementById('blink'), both = document.getElementById('both');
+const swipe = document.getElementById("swipe"), blink = document.getElementById("blink");
+const both = document.getElementById("both");
 let timer = 0;
 function show(percent) {
   over.style.clipPath = 'inset(0 0 0 ' + percent + '%)';

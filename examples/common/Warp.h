@@ -16,8 +16,8 @@ inline Size sizeOf(const Image& image) {
     return {image->width, image->height};
 }
 
-// Warps `picture` (U8G or U8ZYX) by H, which takes its pixels to those of the result, into a new picture: bilinear, zero outside. Pixel
-// (0, 0) is the centre of the first one.
+// Warps `picture` (U8G or U8ZYX) by H, which takes its pixels to those of the result, into a new picture: bilinear, zero
+// outside. Pixel (0, 0) is the centre of the first one.
 Image warpPicture(const Image& picture, const kelMat& H, Size size);
 
 } // namespace kel_examples

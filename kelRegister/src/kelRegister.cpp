@@ -10,14 +10,15 @@ namespace kelRegister {
 namespace {
 
 constexpr int kLeastPlaces = 12;       // that agree in the end
-constexpr double kLeastShare = 0.35;   // of the patches
 constexpr double kMostExpected = 2;    // pixels of the second picture
 constexpr double kMostRepeating = 0.5; // of the agreeing patches
+constexpr double kLongest = 16;        // of squared half circumferences to areas, 14 : 1
 constexpr double kViewMargin = 6;      // working pixels from the edge
 constexpr int kViewFeatures = 500;     // keypoints of a squeezed view
 constexpr double kSupportReach = 0.2;  // of the first picture's diagonal
 constexpr double kSupportSlack = 3;    // working pixels of the second
 constexpr int kMostPatches = 600;      // that are compared; fewer where few features are asked for
+constexpr double kLeastLast = 1e-6;    // of the homography's last element beside a point's third coordinate
 constexpr int kLeastMatches = 5;       // to try a fit on
 
 std::string whyWrong(const Options& options) {
@@ -76,7 +77,9 @@ public:
 
 private:
     static void addViews(const Pyramid& picture, int most, std::vector<Feature>& features) {
-        for (int eighths = 0; eighths < kViews; ++eighths) {
+        const double sum = picture.width + picture.height, product = static_cast<double>(picture.width) * picture.height;
+        const bool isStrip = sum * sum > kLongest * product; // aslant it would fill a small part of a huge square
+        for (int eighths = 0; eighths < kViews; eighths += isStrip ? 2 : 1) {
             const View view = makeView(picture, eighths);
             for (Feature f : findFeatures(view.pyramid, most)) {
                 const Point place = view.toPicture.at(pointOf(f));
@@ -103,6 +106,8 @@ private:
     // Matching to verdict with the features that there are.
     bool attempt() {
         Result& r = m_result;
+        r.tested = r.agreeing = 0;
+        r.share = r.expectedError = 0;
         r.matches = matchFeatures(r.first, r.second);
         const double diagonal = std::hypot(m_first.width, m_first.height);
         const std::vector<bool> marks =
@@ -136,6 +141,8 @@ private:
         r.expectedError = static_cast<float>(error);
         if (!(error <= kMostExpected))
             return refuse("the places that agree lie too close together to tell of the whole");
+        if (!(std::fabs(H.m[8]) > kLeastLast * std::fabs(H.weight(judgement.pairs[0].first))))
+            return refuse("the first pixel lies on the horizon");
         accept(H, all);
         return true;
     }

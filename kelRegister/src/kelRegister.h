@@ -1,7 +1,7 @@
 /**
  * @file kelRegister.h
- * Registration of two pictures: the homography from the first to the second, judged by the pictures themselves, or the reason why
- * there is none. A library of its own, libkelRegister, over the two halves of kel.
+ * Registration of two pictures: the homography from the first to the second, judged by the pictures themselves, or the reason
+ * why there is none. A library of its own, libkelRegister, over the two halves of kel.
  *
  * Compiles as C++11. Throughout
  *  - coordinates are pixels of the picture as it was given, (0, 0) being the centre of its first pixel;
@@ -33,8 +33,9 @@ struct Options {
 };
 
 /**
- * A keypoint with the description of its neighbourhood. Point (u, v) of the upright, unit-size frame of a feature lies in the picture
- * at (x, y) + R(direction) diag(squeeze, 1) R(-direction) R(angle) scale (u, v), R being a turn from the x axis to the y axis.
+ * A keypoint with the description of its neighbourhood. Point (u, v) of the upright, unit-size frame of a feature lies in the
+ * picture at (x, y) + R(direction) diag(squeeze, 1) R(-direction) R(angle) scale (u, v), R being a turn from the x axis to the
+ * y axis.
  */
 struct Feature {
     float x, y;
@@ -62,8 +63,8 @@ struct Result {
     int tested;         ///< Patches of one picture that were compared with the other one through the homography.
     int agreeing;       ///< Those that look alike there, and lie where the homography says.
     float share;        ///< agreeing / tested, 0 where nothing was tested; see registerPictures().
-    /// What error is to be expected of H where the pictures overlap, in pixels of the second one: the root mean square that the spread
-    /// of the agreeing patches allows. A scene that is no plane is not known to it.
+    /// What error is to be expected of H where the pictures overlap, in pixels of the second one: the root mean square that the
+    /// spread of the agreeing patches allows. A scene that is no plane is not known to it.
     float expectedError;
     std::vector<Feature> first, second; ///< Features of both pictures.
     std::vector<Match> matches;         ///< Tentative pairs of these.
@@ -77,35 +78,36 @@ struct Result {
  * "Distinctive image features from scale-invariant keypoints", 2004; roots of shares after R. Arandjelovic and A. Zisserman,
  * "Three things everyone should know to improve object retrieval", 2012).
  *
- * Colours count by their unweighted mean; values of S16G are spread from their least to their greatest over 0 .. 255. Of the options,
- * mostFeatures and workingSize count. A picture without features gives none; where the picture or an option cannot be used, `reason`,
- * unless it is null, receives why, and is left alone otherwise.
+ * Colours count by their unweighted mean; values of S16G are spread from their least to their greatest over 0 .. 255. Of the
+ * options, mostFeatures and workingSize count. A picture without features gives none; where the picture or an option cannot be
+ * used, `reason`, unless it is null, receives why, and is left alone otherwise.
  */
 KEL_API std::vector<Feature> findFeatures(const kelImage_t* picture, const Options& options = Options(),
                                           std::string* reason = nullptr);
 
 /**
- * Pairs of features that are each other's nearest by the sum of absolute differences, nearer than 0.95 times the next one at another
- * place, seen from either side. Of several pairs that join the same two places the nearest is kept. Marks nothing as inlier.
+ * Pairs of features that are each other's nearest by the sum of absolute differences, nearer than 0.95 times the next one at
+ * another place, seen from either side. Of several pairs that join the same two places the nearest is kept. Marks nothing as
+ * inlier.
  */
 KEL_API std::vector<Match> matchFeatures(const std::vector<Feature>& first, const std::vector<Feature>& second);
 
 /**
  * Finds the homography that takes the first picture to the second one.
  *
- * Matched features propose it (robust fits, M. Fischler and R. Bolles, "Random sample consensus", 1981); then patches of the coarser
- * picture are looked for in the other one, brought to the same scale and shape by the homography, by normalised correlation, and the
- * homography is fitted anew to where they were found. At least 12 places and 35 % of the patches must agree in the end. Right
- * answers reach 44 % and more, chance far less; a lower share tells that the scene is no plane, that it moved, or that the pictures
- * are of very different light or sharpness.
+ * Matched features propose it (robust fits, M. Fischler and R. Bolles, "Random sample consensus", 1981); then patches of the
+ * coarser picture are looked for in the other one, brought to the same scale and shape by the homography, by normalised
+ * correlation, and the homography is fitted anew to where they were found. At least 12 places and 35 % of the patches must
+ * agree in the end. Right answers reach 44 % and more, chance far less; a lower share tells that the scene is no plane, that it
+ * moved, or that the pictures are of very different light or sharpness.
  *
  * The same types as findFeatures(); the two may differ in type and size. Neither picture may be null.
  */
 KEL_API Result registerPictures(const kelImage_t* first, const kelImage_t* second, const Options& options = Options());
 
 /**
- * A picture made ready once for several registrations: its levels and its features, which take half of the time. A video registers
- * every frame to the one before and moves it along. Nothing of the picture itself is kept, nor pointed to.
+ * A picture made ready once for several registrations: its levels and its features, which take half of the time. A video
+ * registers every frame to the one before and moves it along. Nothing of the picture itself is kept, nor pointed to.
  */
 class Prepared {
 public:

@@ -32,8 +32,8 @@ std::vector<Candidate> detect(const Pyramid& pyramid) {
     return candidates;
 }
 
-// Half of the room is shared evenly by a grid over the picture; the strongest of every level are taken, too, so that a picture four times
-// as large is known by its coarse levels; what room is left goes to the strongest of the rest.
+// Half of the room is shared evenly by a grid over the picture; the strongest of every level are taken, too, so that a picture
+// four times as large is known by its coarse levels; what room is left goes to the strongest of the rest.
 std::vector<Candidate> strongest(std::vector<Candidate> candidates, int width, int height, int levels, int most) {
     constexpr int kColumns = 8, kRows = 6;
     if (static_cast<int>(candidates.size()) <= most)

@@ -1,5 +1,5 @@
-// Robust fits of a homography to pairs, in units of the pairs themselves, so that libkel's bounds of plausibility speak of the region
-// that the pairs cover.
+// Robust fits of a homography to pairs, in units of the pairs themselves, so that libkel's bounds of plausibility speak of the
+// region that the pairs cover.
 #include <algorithm>
 #include <cmath>
 #include <set>

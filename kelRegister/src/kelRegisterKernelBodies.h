@@ -34,8 +34,8 @@ void gradients(uint16_t* out, const uint8_t* p, ptrdiff_t step, int width) {
     }
 }
 
-// Samples 4k .. 4k+3 lie 0.625, 0.875, 1.125 and 1.375 cells behind the centre of cell k-1 (cells -1 and 4 do not exist): what they
-// give to cells k-1, k and k+1.
+// Samples 4k .. 4k+3 lie 0.625, 0.875, 1.125 and 1.375 cells behind the centre of cell k-1 (cells -1 and 4 do not exist): what
+// they give to cells k-1, k and k+1.
 struct Shares {
     Eight before, here, behind;
 };

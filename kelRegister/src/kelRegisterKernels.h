@@ -13,8 +13,8 @@ constexpr int kDirections = 8; // of a cell
 constexpr int kDescription = kCells * kCells * kDirections;
 
 struct Kernels {
-    // out[x] = strength | direction << 8 of p's pixels 0 .. width-1, up to 7 more: strength min(255, 2 |g|) rounded, direction in
-    // 1/256 of a turn from the x axis to the y axis, g being the differences p[1] - p[-1] and p[step] - p[-step].
+    // out[x] = strength | direction << 8 of p's pixels 0 .. width-1, up to 7 more: strength min(255, 2 |g|) rounded, direction
+    // in 1/256 of a turn from the x axis to the y axis, g being the differences p[1] - p[-1] and p[step] - p[-step].
     void (*gradients)(uint16_t* out, const uint8_t* p, ptrdiff_t step, int width);
     // cells[y][x][direction] += the grid's strengths, shared between the nearest cells and by `directions`, a row of shares for
     // each of the 256 directions.

@@ -1,6 +1,6 @@
-// The vocabulary of vectors: lanes of 128 bits that repeat. Another instruction set is another struct of these names. Everything has
-// internal linkage, and the standard library stays outside: files that include this are compiled for different processors, and
-// nothing of theirs may serve the others.
+// The vocabulary of vectors: lanes of 128 bits that repeat. Another instruction set is another struct of these names.
+// Everything has internal linkage, and the standard library stays outside: files that include this are compiled for different
+// processors, and nothing of theirs may serve the others.
 #ifndef KEL_REGISTER_LANES_H
 #define KEL_REGISTER_LANES_H
 

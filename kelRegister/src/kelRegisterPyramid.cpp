@@ -1,5 +1,5 @@
-// Levels of a picture: halved until it is of working size, then two chains of halves, the second reduced by the root of 2 first; and
-// squeezed views. Smoothing, halving and responses are libkel's.
+// Levels of a picture: halved until it is of working size, then two chains of halves, the second reduced by the root of 2
+// first; and squeezed views. Smoothing, halving and responses are libkel's.
 #include <algorithm>
 #include <cmath>
 
@@ -12,7 +12,8 @@ namespace {
 constexpr int kSmallestLevel = 40; // pixels on the shorter side
 constexpr int kMostOctaves = 4;
 
-// The level of `image`; where `next` is not null, also the image for the one half as large, whose pixels are every second of this.
+// The level of `image`; where `next` is not null, also the image for the one half as large, whose pixels are every second of
+// this.
 Level makeLevel(const Image& image, double scale, double offset, bool withCross, Image* next) {
     const int width = image->width + 2 * kBorder, height = image->height + 2 * kBorder;
     Level level{create(width, height, KEL_PIXEL_TYPE_U8G), Image(), scale, offset};

@@ -1,5 +1,5 @@
-// Refinement by the pictures: patches of the finer one, brought to scale and shape of the coarser one by the homography, are looked for
-// in the coarser one, and the homography is fitted anew to where they are found.
+// Refinement by the pictures: patches of the finer one, brought to scale and shape of the coarser one by the homography, are
+// looked for in the coarser one, and the homography is fitted anew to where they are found.
 #include <algorithm>
 #include <cmath>
 
@@ -13,8 +13,8 @@ namespace {
 constexpr int kReachCoarse = 6, kReachFine = 5; // level pixels either way
 constexpr int kMostReach = 6;
 constexpr int kRounds = 4;
-constexpr double kEnough = 0.7; // share of the patches from which another round is not needed
-constexpr double kTooFew = 0.35, kBlurredShare = 0.5;
+constexpr double kEnough = 0.7;       // share of the patches from which another round is not needed
+constexpr double kBlurredShare = 0.5; // that two of different sharpness have to reach at half size
 constexpr double kNearlyAsMany = 0.8; // of the share before, at which a finer pass counts: it is more exact
 constexpr double kAlike = 0.75;       // least correlation
 constexpr double kRepeated = 0.9;     // of its correlation, from which a patch is alike to another place
@@ -25,13 +25,6 @@ constexpr double kPlace = 6;          // pixels of a working picture between pla
 constexpr int kFraction = 16;         // steps of a grey value in a patch
 
 constexpr int kPixels = kPatch * kPatch;
-
-// The two pictures by their part in this: `toFine` takes the coarser one's pixels to the finer one's.
-struct View {
-    const Pyramid &coarse, &fine;
-    const std::vector<Feature>& places; // of the coarser one
-    bool firstIsCoarse;
-};
 
 // A patch without its mean, in 1/kFraction.
 struct Patch {
@@ -318,6 +311,12 @@ struct Refinement {
         judgement = std::move(next);
         return true;
     }
+
+    void improveWhileItHelps(Judgement& judgement, double scale, int reach) {
+        int rounds = 0;
+        while (rounds++ < kRounds && judgement.share() < kEnough && improve(judgement, scale, reach))
+            ;
+    }
 };
 
 } // namespace
@@ -344,13 +343,10 @@ Judgement refine(const Pyramid& first, const Pyramid& second, const std::vector<
     Judgement judgement;
     const double working = coarse.workingScale;
     double judged = working;
-    for (int round = 0; round < kRounds && judgement.share() < kEnough && r.improve(judgement, 2 * working, kReachCoarse);
-         ++round)
-        ;
+    r.improveWhileItHelps(judgement, 2 * working, kReachCoarse);
     judgement = Judgement(); // at half size compromises agree with much; what counts is what the working pictures say
-    for (int round = 0; round < kRounds && judgement.share() < kEnough && r.improve(judgement, working, kReachFine); ++round)
-        ;
-    if (judgement.share() < kTooFew) { // one of the two may be out of focus: judged at half size then, but strictly
+    r.improveWhileItHelps(judgement, working, kReachFine);
+    if (judgement.share() < kLeastShare) { // one of the two may be out of focus: judged at half size then, but strictly
         r.threshold /= 2;
         Judgement strict;
         if (r.improve(strict, 2 * working, kReachCoarse) && r.improve(strict, 2 * working, kReachCoarse, kNearlyAsMany) &&

@@ -38,7 +38,6 @@ struct Point {
 struct Map {
     double m[9];
 
-    static Map identity() { return {{1, 0, 0, 0, 1, 0, 0, 0, 1}}; }
     double weight(Point p) const { return m[6] * p.x + m[7] * p.y + m[8]; }
     Point at(Point p) const {
         const double w = weight(p);
@@ -54,7 +53,8 @@ struct Map {
     Map operator*(const Map& other) const;
 };
 
-// A smoothed level of a picture with a border all round. Level pixel p (without its border) is picture pixel p * scale + offset.
+// A smoothed level of a picture with a border all round. Level pixel p (without its border) is picture pixel p * scale +
+// offset.
 constexpr int kBorder = 32; // so that no neighbourhood leaves it
 struct Level {
     Image smooth;
@@ -68,9 +68,9 @@ struct Level {
 
 // All levels of a picture. Those before `firstWorking` are finer than the working picture.
 struct Pyramid {
-    int width, height;   // of the picture
-    double workingScale; // picture pixels to a pixel of the working picture
-    size_t firstWorking;
+    int width = 0, height = 0; // of the picture
+    double workingScale = 1;   // picture pixels to a pixel of the working picture
+    size_t firstWorking = 0;
     Image working; // what views are made of; empty in a view
     std::vector<Level> levels;
 };
@@ -110,15 +110,15 @@ struct Bound {
 
 // ---- kelRegisterSupport.cpp ----
 
-// Whether two others within `reach` pixels of the first picture lie where a match's own two frames predict them, give or take `slack` pixels of
-// the second and a share of the distance.
+// Whether two others within `reach` pixels of the first picture lie where a match's own two frames predict them, give or take
+// `slack` pixels of the second and a share of the distance.
 std::vector<bool> supported(const std::vector<Feature>& first, const std::vector<Feature>& second,
                             const std::vector<Match>& matches, double reach, double slack);
 
 // ---- kelRegisterFit.cpp ----
 
-// The best of several robust fits to the one set, polished by least squares on those of the other that agree. Of the two bounds the
-// wider one holds. False where there is none that is plausible.
+// The best of several robust fits to the one set, polished by least squares on those of the other that agree. Of the two bounds
+// the wider one holds. False where there is none that is plausible.
 bool fitRobustly(const std::vector<Pair>& proposing, const std::vector<Pair>& polishing, Bound bound, Map& H);
 // Marks the pairs that a homography takes to each other within either bound, there or back.
 std::vector<bool> agreeing(const Map& H, const std::vector<Pair>& pairs, Bound bound);
@@ -126,6 +126,8 @@ std::vector<bool> agreeing(const Map& H, const std::vector<Pair>& pairs, Bound b
 int differentPlaces(const std::vector<Pair>& pairs, const std::vector<bool>& marked, Bound cell);
 
 // ---- kelRegisterRefinement.cpp ----
+
+constexpr double kLeastShare = 0.35; // of the patches, from which pictures agree
 
 // What the pictures say about a homography.
 struct Judgement {
@@ -141,8 +143,8 @@ Judgement refine(const Pyramid& first, const Pyramid& second, const std::vector<
 
 // ---- kelRegisterTrust.cpp ----
 
-// The error that a homography fitted to these pairs is to be expected to have, in pixels of the second picture: the root of the mean
-// square over the part of the first picture that falls into the second one.
+// The error that a homography fitted to these pairs is to be expected to have, in pixels of the second picture: the root of the
+// mean square over the part of the first picture that falls into the second one.
 double expectedError(const Map& H, const std::vector<Pair>& pairs, const Pyramid& first, const Pyramid& second);
 
 } // namespace kelRegister

@@ -196,6 +196,7 @@ TEST(Register, RefusesInWordsWhatCannotBeRegistered) {
         {64, 64, KEL_PIXEL_TYPE_S8XYZ, "the first picture has pixel type 9, which cannot be registered"},
         {40, 40, KEL_PIXEL_TYPE_U8G, "only 0 matches that support each other of 0"},
         {40, 3000, KEL_PIXEL_TYPE_S16G, "only 0 matches that support each other of 0"},
+        {41, 30000, KEL_PIXEL_TYPE_U8XYZ, "only 0 matches that support each other of 0"},
         {3000, 41, KEL_PIXEL_TYPE_U8ZYXA, "only 0 matches that support each other of 0"},
     };
     for (const auto& row : table) {
