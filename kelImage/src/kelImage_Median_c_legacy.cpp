@@ -29,7 +29,8 @@ void applyKelFilterMedianNXN(kelImage_t* dst, kelImage_t* src, kelValue_s32 n) {
     if (src->type != KEL_PIXEL_TYPE_U8G || n < 1)
         return;
     const size_t side = 2 * static_cast<size_t>(n) + 1;
-    uint8_t* const window = static_cast<uint8_t*>(malloc(side * side));
+    const bool fits = src->width > 2 * int64_t(n) && src->height > 2 * int64_t(n); // else there is nothing to sort
+    uint8_t* const window = fits ? static_cast<uint8_t*>(malloc(side * side)) : nullptr;
     for (kelValue_s32 y = 0; y < src->height; ++y)
         for (kelValue_s32 x = 0; x < src->width; ++x) {
             const bool inside = x >= n && x < src->width - n && y >= n && y < src->height - n;
