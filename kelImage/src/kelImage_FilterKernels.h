@@ -12,9 +12,8 @@ template <int first, int second, class V> V weighed(V pairs) {
     return weighBytes(pairs, V::words(second * 256 + (first & 255)));
 }
 
-// ---- Gaussian 5x5: weights (1, 4, 6, 4, 1) both ways, rounded once. Sums across are 0..4080; down they are at most 65280,
-// 65408
-// rounded, which is unsigned 16 bits.
+// ---- Gaussian 5x5: weights (1, 4, 6, 4, 1) both ways, rounded once. Sums across are 0..4080; down they are at most 65280, with
+// the half that rounds them 65408, which is unsigned 16 bits.
 
 constexpr ptrdiff_t kReach5 = 2; // taps on either side of the centre, and the columns at either end that come out as zero
 constexpr int kRound5 = 128, kShift5 = 8;
@@ -164,9 +163,8 @@ void crossRow(int16_t* d, const uint8_t* s, ptrdiff_t pitch, ptrdiff_t distance,
     });
 }
 
-// ---- Sobel magnitude in single precision, by the thread's rounding mode. Gradients are exact in 16 bits (-1020..1020), the
-// sum
-// of their squares, at most 2080800, in single precision.
+// ---- Sobel magnitude in single precision, by the thread's rounding mode. Gradients are exact in 16 bits (-1020..1020); the sum
+// of their squares, at most 2080800, is in single precision.
 
 template <class V> V rootsOfSquares(V gxgy) {
     return rounded(rootOf(floatsOf(weighWords(gxgy, gxgy))));

@@ -39,8 +39,7 @@ struct Lanes1 {
         __builtin_memcpy(&four, p, sizeof four);
         return {_mm_cvtepu8_epi32(_mm_cvtsi32_si128(four))};
     }
-    // Eight bytes from addresses p + 4 * index, two to a lane; the indices of a lane are `apart` behind those of the one
-    // before.
+    // Eight bytes from addresses p + 4 * index, two to a lane; the indices of two neighbouring lanes are `apart`.
     static Lanes1 loadEights(const void* p, const int32_t* index, ptrdiff_t) {
         const auto* const base = static_cast<const uint8_t*>(p);
         const __m128i first = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(base + 4 * ptrdiff_t(index[0])));

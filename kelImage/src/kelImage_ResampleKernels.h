@@ -7,9 +7,8 @@
 
 namespace {
 
-// ---- Grey at whole-number ratios: (a + b + c + d + 2) / 4 of a pixel, its neighbour, and those below. The compiler makes
-// vectors
-// of it for the usual ratios.
+// ---- Grey at whole-number ratios: (a + b + c + d + 2) / 4 of a pixel, its neighbour, and those below. For the usual ratios the
+// compiler makes vectors of it.
 
 template <int R>
 void averageAtRatio(uint8_t* __restrict d, const uint8_t* __restrict s, const uint8_t* __restrict below, ptrdiff_t width,
@@ -80,9 +79,8 @@ void mixRows(uint8_t* d, const uint8_t* above, const uint8_t* below, int weight,
         d[i] = static_cast<uint8_t>((above[i] * (256 - weight) + below[i] * weight) >> 8);
 }
 
-// ---- Reduction of four-byte pixels: averages of inputs under a box, each with its weight, rounding down. Inputs come in
-// pairs,
-// whose weights stand side by side. Division by the box is a multiplication with its reciprocal, rounded up: exact in 16 bits
+// ---- Reduction of four-byte pixels: averages of inputs under a box, each with its weight, rounding down. Inputs come in pairs
+// with their weights side by side. Division by the box is a multiplication with its reciprocal, rounded up: exact in 16 bits
 // while 255 * box * box < 2^16, in 32 bits for boxes up to 4103.
 
 // Weights up to 16: sums are words of at most 255 * 16.

@@ -31,8 +31,7 @@ inline void walk(uint8_t* d, const uint8_t* s, ptrdiff_t units, Body body) {
     }
 }
 
-// Calls body(of, x) for blocks of N columns a lane from `begin` on, while they start before `end`; end - begin is a multiple of
-// N.
+// Calls body(of, x) for blocks of N columns a lane from `begin` to `end`, which are a multiple of N apart.
 template <int N, class Body> inline void walkColumns(ptrdiff_t begin, ptrdiff_t end, Body body) {
     ptrdiff_t x = begin;
     for (; x + N * Wide::kLanes <= end; x += N * Wide::kLanes)
