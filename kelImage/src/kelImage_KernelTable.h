@@ -1,5 +1,5 @@
 // The table of kernels for the instruction set of the file that includes this. Before, it includes its vocabulary of lanes and
-// names Wide and KEL_KERNELS_OF, the namespace of the table.
+// names Wide, Modest and KEL_KERNELS_OF, the namespace of the table.
 #ifndef KEL_IMAGE_KERNEL_TABLE_H
 #define KEL_IMAGE_KERNEL_TABLE_H
 

@@ -3,7 +3,8 @@
 
 namespace {
 using Wide = Lanes2;
-}
+using Modest = Lanes2;
+} // namespace
 #define KEL_KERNELS_OF avx2
 
 #include "kelImage_KernelTable.h"

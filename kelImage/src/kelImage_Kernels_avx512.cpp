@@ -3,7 +3,8 @@
 
 namespace {
 using Wide = Lanes4;
-}
+using Modest = Lanes2;
+} // namespace
 #define KEL_KERNELS_OF avx512
 
 #include "kelImage_KernelTable.h"

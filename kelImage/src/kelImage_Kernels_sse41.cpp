@@ -3,7 +3,8 @@
 
 namespace {
 using Wide = Lanes1;
-}
+using Modest = Lanes1;
+} // namespace
 #define KEL_KERNELS_OF sse41
 
 #include "kelImage_KernelTable.h"

@@ -1,9 +1,9 @@
-// The vocabulary of kernels for AVX-512 (F, BW, VL and VBMI): four lanes of 128 bits, and one for what is left of a row. What
-// the names mean stands in the vocabulary for SSE4.1.
+// The vocabulary of kernels for AVX-512 (F, BW, VL and VBMI): four lanes of 128 bits, beside the two of AVX2 and
+// the one for what is left of a row. What the names mean stands in the vocabulary for SSE4.1.
 #ifndef KEL_IMAGE_LANES_AVX512_H
 #define KEL_IMAGE_LANES_AVX512_H
 
-#include "kelImage_Lanes_sse41.h"
+#include "kelImage_Lanes_avx2.h"
 
 namespace {
 

@@ -97,7 +97,7 @@ template <class V> V inRange(V i, V end) {
 // U8G is sampled through pixel centres with truncation (`centred`), other types through pixel corners with 0.5 added to the
 // quotient: callers rely on the difference.
 template <bool centred, int N> void warpRow(uint8_t* d, ptrdiff_t width, float y, const float* h, const kel::WarpSource& src) {
-    using V = Wide;
+    using V = Modest;
     using P = kel::Pixel<N>;
     constexpr int columns = V::kBytes / 4;
     P* const to = reinterpret_cast<P*>(d);

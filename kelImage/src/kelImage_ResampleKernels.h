@@ -189,24 +189,23 @@ void reduceDown(uint8_t* d, const uint8_t* const* row, const uint16_t* weights, 
     }
 }
 
-// ---- Two to one both ways: halves across, then down, each rounding down. Averages round up, so they are taken of complements:
-// 255 - (a + b) / 2, rounded up, is the average of 255 - a and 255 - b.
+// ---- Two to one both ways: halves across, then down, each rounding down.
 
-template <class V> V complementOf(V a) {
-    return subBytes(V::bytes(255), a);
+// An average rounds up; together with the one that rounds down it makes the sum.
+template <class V> V halfOfSum(V a, V b) {
+    return subBytes(addBytes(a, b), averageBytes(a, b));
 }
 
-template <class V> V complementAcross(const uint32_t* s) { // halves of lanes are still to be put in order
-    const V low = complementOf(V::load(s)), high = complementOf(V::load(s + V::kBytes / 4));
-    return averageBytes(evenLongs(low, high), oddLongs(low, high));
+template <class V> V halvedAcross(const uint32_t* s) { // halves of lanes are still to be put in order
+    const V low = V::load(s), high = V::load(s + V::kBytes / 4);
+    return halfOfSum(evenLongs(low, high), oddLongs(low, high));
 }
 
 void halveBothWays(uint32_t* d, const uint32_t* above, const uint32_t* below, ptrdiff_t width) {
     const ptrdiff_t whole = width / 4 * 4;
     walkColumns<4>(0, whole, [=](auto of, ptrdiff_t x) {
         using V = LanesOf<decltype(of)>;
-        store(d + x,
-              ordered(complementOf(averageBytes(complementAcross<V>(above + 2 * x), complementAcross<V>(below + 2 * x)))));
+        store(d + x, ordered(halfOfSum(halvedAcross<V>(above + 2 * x), halvedAcross<V>(below + 2 * x))));
     });
     const auto half = [](uint32_t a, uint32_t b) { return (a & b) + ((a ^ b) >> 1 & 0x7f7f7f7f); };
     for (ptrdiff_t x = whole; x < width; ++x)
