@@ -40,7 +40,7 @@ inline cv::Mat mat(const kelImage_t* image) {
 
 // Adds a line at every size for an operation that reads each pixel of `src` and writes each pixel of `dst`, of equal sizes.
 inline void addPixelLines(const std::string& operation, int dstType, int srcType, const Call& kel, const Peer& opencv,
-                          const Peer& libyuv) {
+                          const Peer& other, const char* otherName = "libyuv") {
     for (const ImageSize& size : kImageSizes) {
         std::vector<Run> runs;
         double bytesOf[2] = {};
@@ -56,7 +56,7 @@ inline void addPixelLines(const std::string& operation, int dstType, int srcType
         };
         addRun("kel", kel, "");
         addRun("OpenCV", opencv.call, opencv.differs);
-        addRun("libyuv", libyuv.call, libyuv.differs);
+        addRun(otherName, other.call, other.differs);
         for (int i = 0; i < 2; ++i) {
             kelImage_t* header = createKelImageHeader(size.width, size.height, i ? dstType : srcType);
             bytesOf[i] = header->size;

@@ -64,7 +64,7 @@ std::string picture(const std::vector<Row>& rows) {
         << "<g font-size='14'>"
         << text(12, 22, "start", "#1f2328", "Time of kel / time of the fastest peer, images of 1920x1080") << "</g>\n"
         << text(12, 40, "start", kQuiet, "disc: kel as it runs there; ring: its kernels for AVX2; tick: its kernels for SSE4.1")
-        << text(at(1) - 8, 62, "end", kAhead, "kel is faster") << text(at(1) + 8, 62, "start", kBehind, "kel is slower");
+        << text(at(1) - 8, 50, "end", kAhead, "kel is faster") << text(at(1) + 8, 50, "start", kBehind, "kel is slower");
     for (double ratio = kLeast; ratio <= kGreatest; ratio *= 2)
         out << rule(at(ratio), kTop - 6, bottom, std::string("stroke='") + kRule + "'")
             << text(at(ratio), kTop - 26 + (ratio == 1 ? 0 : 12), "middle", kQuiet,

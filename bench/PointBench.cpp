@@ -27,7 +27,7 @@ void addLines() {
         cv::adaptiveThreshold(mat(s), to, 255, cv::ADAPTIVE_THRESH_MEAN_C, cv::THRESH_BINARY, 25, 0);
     });
     addPixelLines("adjustKelImage", g, g, adjustKelImage, {normalize, "double-precision scale and shift"},
-                  {scaled, "single-precision scale and shift"});
+                  {scaled, "single-precision scale and shift"}, "OpenCV convertTo");
     addPixelLines("binalizeKelImage", g, g, [](kelImage_t* d, const kelImage_t* s) { binalizeKelImage(d, s, 128); },
                   {threshold}, {});
     addPixelLines("binalizeKelImageAdaptive", g, g,
