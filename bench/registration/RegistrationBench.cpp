@@ -42,7 +42,7 @@ struct Case {
 struct Answer {
     bool found;
     Plane H;
-    double share;
+    double share, expected;
     std::string reason;
 };
 
@@ -50,7 +50,7 @@ using Method = std::function<Answer(const Case&)>;
 
 Answer byKel(const Case& c) {
     const kelRegister::Result r = kelRegister::registerPictures(c.first, c.second);
-    Answer answer = {r.found, Plane::scale(1, 1), r.share, r.reason};
+    Answer answer = {r.found, Plane::scale(1, 1), r.share, r.expectedError, r.reason};
     if (r.found)
         std::copy_n(r.H.m_Data, 9, answer.H.m);
     return answer;
@@ -66,7 +66,7 @@ Answer byChain(const cv::Ptr<cv::Feature2D>& detector, int norm, const Case& c) 
     cv::Mat ofFirst, ofSecond;
     detector->detectAndCompute(matOf(c.first), cv::noArray(), first, ofFirst);
     detector->detectAndCompute(matOf(c.second), cv::noArray(), second, ofSecond);
-    Answer answer = {false, Plane::scale(1, 1), 0, ""};
+    Answer answer = {false, Plane::scale(1, 1), 0, 0, ""};
     if (first.size() < 2 || second.size() < 2)
         return answer;
     std::vector<std::vector<cv::DMatch>> matches;
@@ -309,8 +309,9 @@ void measure(const char* name, const Method& method, const Cases& cases, const s
             }
             const bool bad = c.belongs ? !answer.found || error >= kFound : answer.found;
             if (verbose || (bad && seed == 1 && std::string(name) == "kel"))
-                std::printf("  %s: %s, seed %d: %s, error %.2f, share %.2f, %.0f ms %s\n", c.kind.c_str(), c.name.c_str(), seed,
-                            answer.found ? "found" : "refused", error, answer.share, time, answer.reason.c_str());
+                std::printf("  %s: %s, seed %d: %s, error %.2f, expected %.2f, share %.2f, %.0f ms %s\n", c.kind.c_str(),
+                            c.name.c_str(), seed, answer.found ? "found" : "refused", error, answer.expected, answer.share,
+                            time, answer.reason.c_str());
         }
     }
     std::printf(
@@ -345,7 +346,7 @@ int main(int argc, char** argv) {
     app.add_option("--warps", warps, "of each kind for each picture")->capture_default_str();
     app.add_option("--harder", harder, "variants of each pair of photographs")->capture_default_str();
     app.add_option("--strangers", strangers, "pairs of pictures that do not belong together")->capture_default_str();
-    app.add_option("--kind", kinds, "only rows of these names");
+    app.add_option("--kind", kinds, "only the row of this name; may be repeated")->allow_extra_args(false);
     app.add_flag("--peers", peers, "beside chains of ORB and SIFT");
     app.add_flag("--verbose", verbose, "a line for every pair");
     CLI11_PARSE(app, argc, argv);

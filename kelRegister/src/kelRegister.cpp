@@ -10,7 +10,7 @@ namespace kelRegister {
 namespace {
 
 constexpr int kLeastPlaces = 12;       // that agree in the end
-constexpr double kMostExpected = 2;    // pixels of the second picture
+constexpr double kMostExpected = 1.5;  // pixels of the second picture
 constexpr double kMostRepeating = 0.5; // of the agreeing patches
 constexpr double kLongest = 16;        // of squared half circumferences to areas, 14 : 1
 constexpr double kViewMargin = 6;      // working pixels from the edge

@@ -98,7 +98,7 @@ KEL_API std::vector<Match> matchFeatures(const std::vector<Feature>& first, cons
  * Matched features propose it (robust fits, M. Fischler and R. Bolles, "Random sample consensus", 1981); then patches of the
  * coarser picture are looked for in the other one, brought to the same scale and shape by the homography, by normalised
  * correlation, and the homography is fitted anew to where they were found. At least 12 places and 35 % of the patches must
- * agree in the end. Right answers reach 44 % and more, chance far less; a lower share tells that the scene is no plane, that it
+ * agree in the end. Sharp pictures of one plane reach 60 % and more, chance far less; a lower share tells that the scene is no plane, that it
  * moved, or that the pictures are of very different light or sharpness.
  *
  * The same types as findFeatures(); the two may differ in type and size. Neither picture may be null.

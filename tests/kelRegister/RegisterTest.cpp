@@ -64,7 +64,7 @@ TEST_P(Geometry, IsFoundInBothDirections) {
         const Result back = registerPictures(view.get(), scene().get());
         EXPECT_LT(errorOf(back, H.inverse(), view.get(), scene().get()), GetParam().allowed / shrink);
         EXPECT_GT(std::min(there.share, back.share), 0.6f);
-        EXPECT_LT(there.expectedError, 2);
+        EXPECT_LT(there.expectedError, 1);
         const Plane is = planeOf(there), undo = is.inverse();
         for (const Match& match : there.matches) { // within three pixels of either picture
             const Feature &a = there.first[match.first], &b = there.second[match.second];
