@@ -147,8 +147,7 @@ enum Kinds { GreyOnly, WholePixels, AnyKind }; // one byte grey; all but UYVY; a
 class Picture {
 public:
     /** @param padded whether what lies behind the rows counts; @param dense whether rows must follow each other without a gap */
-    Picture(const py::handle& object, const char* name, Kinds kinds, bool padded = false, bool dense = false)
-        : m_dense(dense) {
+    Picture(const py::handle& object, const char* name, Kinds kinds, bool padded = false, bool dense = false) : m_dense(dense) {
         if (!py::isinstance<py::array>(object))
             wrongType(name, "a NumPy array");
         m_array = py::reinterpret_borrow<py::array>(object);
@@ -163,8 +162,8 @@ public:
         m_step = dense ? m_width : (m_width + 15) / 16 * 16;
         if (!isLaidOut(padded))
             m_own = kel::Image(m_width, m_height, m_type);
-        m_header = std::make_unique<Header>(m_width, m_height, m_type,
-                                            m_own ? m_own->data : static_cast<unsigned char*>(const_cast<void*>(m_array.data())));
+        m_header = std::make_unique<Header>(
+            m_width, m_height, m_type, m_own ? m_own->data : static_cast<unsigned char*>(const_cast<void*>(m_array.data())));
     }
 
     void load() {
@@ -196,8 +195,9 @@ private:
         if (wide && !dtype.attr("isnative").cast<bool>())
             wrongType(name, "of this machine's byte order");
         const py::ssize_t channels = m_array.ndim() == 2 ? 1 : m_array.ndim() == 3 ? m_array.shape(2) : 0;
-        if (kinds == GreyOnly ? m_array.ndim() != 2
-                              : (channels < 1 || channels > 4 || (m_array.ndim() == 3 && channels == 1) || (wide && channels > 1)))
+        if (kinds == GreyOnly
+                ? m_array.ndim() != 2
+                : (channels < 1 || channels > 4 || (m_array.ndim() == 3 && channels == 1) || (wide && channels > 1)))
             wrongValue(name, kinds == GreyOnly ? "H x W" : "H x W, or of type uint8 and H x W x 2, 3 or 4");
         if (kinds == WholePixels && channels == 2)
             wrongValue(name, "no UYVY: convert it first");
@@ -238,7 +238,8 @@ private:
 
     // A pair of UYVY that an odd width cuts takes the V of the pair before; without one there, none.
     void fill(unsigned char* row) const {
-        unsigned char *to = row + static_cast<size_t>(m_width) * pixel(), *const end = row + static_cast<size_t>(m_step) * pixel();
+        unsigned char *to = row + static_cast<size_t>(m_width) * pixel(), *const end =
+                                                                              row + static_cast<size_t>(m_step) * pixel();
         if (m_type == KEL_PIXEL_TYPE_U8YUV) {
             const unsigned char u = *(to - (m_width % 2 ? 2 : 4)), y = *(to - 1);
             const unsigned char v = m_width % 2 == 0 ? *(to - 2) : m_width > 1 ? *(to - 4) : 128;

@@ -19,7 +19,8 @@ py::array_t<double> toArray(const kelMat& matrix) {
 }
 
 bool isFinite(const kelMat& matrix) {
-    return std::all_of(matrix.m_Data, matrix.m_Data + matrix.m_Height * matrix.m_Width, [](float v) { return std::isfinite(v); });
+    return std::all_of(matrix.m_Data, matrix.m_Data + matrix.m_Height * matrix.m_Width,
+                       [](float v) { return std::isfinite(v); });
 }
 
 enum Method { Ransac, LeastSquares, Taubin };

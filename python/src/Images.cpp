@@ -16,8 +16,8 @@ struct Format {
     const char* name;
     int type;
 };
-constexpr Format kFormats[] = {{"GREY", KEL_PIXEL_TYPE_U8G},   {"GREY16", KEL_PIXEL_TYPE_S16G}, {"BGR", KEL_PIXEL_TYPE_U8XYZ},
-                               {"RGB", KEL_PIXEL_TYPE_U8ZYX},  {"BGRA", KEL_PIXEL_TYPE_U8XYZA}, {"RGBA", KEL_PIXEL_TYPE_U8ZYXA},
+constexpr Format kFormats[] = {{"GREY", KEL_PIXEL_TYPE_U8G},  {"GREY16", KEL_PIXEL_TYPE_S16G}, {"BGR", KEL_PIXEL_TYPE_U8XYZ},
+                               {"RGB", KEL_PIXEL_TYPE_U8ZYX}, {"BGRA", KEL_PIXEL_TYPE_U8XYZA}, {"RGBA", KEL_PIXEL_TYPE_U8ZYXA},
                                {"UYVY", KEL_PIXEL_TYPE_U8YUV}};
 
 int format(const py::handle& object, const char* name) {
@@ -123,7 +123,7 @@ py::array convert(const py::object& image, const py::object& source, const py::o
     if (to == KEL_PIXEL_TYPE_U8YUV && from != to)
         wrongValue("target", "no UYVY, unless the source is");
     kel::Image dst = make(src.width(), src.height(), to, "image");
-    const int between = isFour(from) && isGrey(to)                                         ? KEL_PIXEL_TYPE_U8XYZ
+    const int between = isFour(from) && isGrey(to)                                  ? KEL_PIXEL_TYPE_U8XYZ
                         : from == KEL_PIXEL_TYPE_U8YUV && to == KEL_PIXEL_TYPE_S16G ? KEL_PIXEL_TYPE_U8G
                                                                                     : -1;
     kel::Image step = between < 0 ? kel::Image() : make(src.width(), src.height(), between, "image");
@@ -245,7 +245,8 @@ namespace {
 // Behind rows that follow each other without a gap, `more` columns and rows that repeat the last: enlargement reads past the edge.
 kel::Image extended(const Header& src, int moreColumns, int moreRows) {
     const int width = src.get()->width, height = src.get()->height, wide = width + moreColumns;
-    kel::Image made = make(wide, height + moreRows + 1LL, src.get()->type, "size"); // a row more: the pixel behind the last is read, too
+    kel::Image made =
+        make(wide, height + moreRows + 1LL, src.get()->type, "size"); // a row more: the pixel behind the last is read, too
     const auto* const from = reinterpret_cast<const uint32_t*>(src.get()->data);
     auto* to = reinterpret_cast<uint32_t*>(made->data);
     for (int y = 0; y <= height + moreRows; ++y, to += wide) {
@@ -318,7 +319,8 @@ py::array resize(const py::object& image, const py::object& size, const py::obje
         wrongValue("method", "smooth, nearest or bilinear");
     const std::pair<int, int> wanted = extent(size, "size");
     const bool smoothly = how == "smooth", fourBytes = smoothly && py::isinstance<py::array>(image) &&
-                                                      image.cast<py::array>().ndim() == 3 && image.cast<py::array>().shape(2) == 4;
+                                                       image.cast<py::array>().ndim() == 3 &&
+                                                       image.cast<py::array>().shape(2) == 4;
     Picture src(image, "image", how == "bilinear" ? GreyOnly : WholePixels, false, !smoothly || fourBytes);
     kel::Image dst = make(wanted.first, wanted.second, src.type(), "size");
     if (smoothly && src.type() == KEL_PIXEL_TYPE_S16G)
@@ -355,7 +357,8 @@ py::array addBorder(const py::object& image, const py::object& size) {
     const int border = integer(size, "size", 0, INT32_MAX / 4);
     const bool dense = py::isinstance<py::array>(image) && image.cast<py::array>().ndim() == 3;
     Picture src(image, "image", WholePixels, true, dense);
-    const bool wide = src.type() == KEL_PIXEL_TYPE_S16G; // its right border starts at the step: the padding repeats the edge up to there
+    const bool wide =
+        src.type() == KEL_PIXEL_TYPE_S16G; // its right border starts at the step: the padding repeats the edge up to there
     kel::Image dst = make((wide ? src.step() : src.width()) + 2LL * border, src.height() + 2LL * border, src.type(), "size");
     {
         const py::gil_scoped_release free;

@@ -79,8 +79,8 @@ py::dict toDict(const Result& result, double seconds) {
     return all;
 }
 
-py::dict registerTwo(const py::object& first, const py::object& second, const py::object& threshold, const py::object& mostFeatures,
-                     const py::object& workingSize, bool views) {
+py::dict registerTwo(const py::object& first, const py::object& second, const py::object& threshold,
+                     const py::object& mostFeatures, const py::object& workingSize, bool views) {
     const Options with = options(threshold, mostFeatures, workingSize, views);
     const auto start = std::chrono::steady_clock::now();
     const bool ready[] = {py::isinstance<Prepared>(first), py::isinstance<Prepared>(second)};
