@@ -467,6 +467,18 @@ TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
     std::vector<bool> mask(9);
     EXPECT_EQ(judgeInliers(identity, onBound, mask, 5), 0) << "a pair at the threshold is an outlier";
     EXPECT_EQ(judgeInliers(flat, onBoundP, mask, 5), 0);
+    // Just at the error of one pair after the other: a sum in another order counts some of them differently.
+    kelMatCorrespP close;
+    kelMat P = projection(random);
+    addPairs(close, P, 200, 2, 0, random);
+    std::vector<bool> closeMask(200), expectedMask(200);
+    for (int i = 0; i < close.m_Num; ++i) {
+        float u, v;
+        P.cvtPoint(close.m_ObjX[i], close.m_ObjY[i], close.m_ObjZ[i], &u, &v);
+        const float error = std::hypot(close.m_ImgX[i] - u, close.m_ImgY[i] - v);
+        for (float threshold : {std::nextafter(error, 0.0f), error, std::nextafter(error, 9.0f)})
+            EXPECT_EQ(judgeInliers(P, close, closeMask, threshold), kel_ref::inliers(P, close, expectedMask, threshold));
+    }
     // A pair that nothing divides by zero at, alone in its block: nothing else is computed.
     kelMatCorrespH far;
     far.add(1, 1, 1, 1);
