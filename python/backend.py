@@ -21,7 +21,7 @@ def _version():
 
 def _metadata():
     return (f"Metadata-Version: 2.1\nName: kel\nVersion: {_version()}\nSummary: Small, exact and fast computer vision\n"
-            "Requires-Python: >=3.9\nRequires-Dist: numpy\nRequires-Dist: pillow\n")
+            "Requires-Python: >=3.10\nRequires-Dist: numpy\nRequires-Dist: pillow\n")
 
 
 def get_requires_for_build_wheel(config_settings=None):

@@ -1,0 +1,457 @@
+"""Registers many pairs of pictures: python3 -m kel.batch PAIRS.csv --output DIR.
+
+On all cores of this machine, or on a cluster of Dask's that is there already. results.csv in DIR grows a batch of pairs at a time, so
+that a run that was broken off goes on where it stopped; index.html shows it.
+"""
+
+import argparse
+import collections
+import csv
+import fcntl
+import hashlib
+import html
+import io
+import logging
+import os
+import sys
+import tempfile
+import threading
+import time
+import zlib
+from typing import Any, Dict, List, NamedTuple, Optional, Sequence, Tuple
+
+import numpy as np
+
+import kel
+
+HEADER = ["id", "found", *(f"h{r}{c}" for r in (1, 2, 3) for c in (1, 2, 3)), "agreement", "inliers", "milliseconds", "reason"]
+THUMBNAIL = 160  # pixels of the longer side
+
+
+Row = Tuple[List[str], bytes]  # of results.csv, and a small picture
+
+
+class Pair(NamedTuple):
+    id: str
+    first: str
+    second: str
+
+
+class Settings(NamedTuple):
+    threshold: float
+    features: int
+    working_size: int
+    memory: int  # bytes of pictures that a worker keeps
+
+
+class Picture(NamedTuple):
+    """A picture as workers keep it: made ready once, with a small copy, or the reason why it is none."""
+
+    prepared: Optional[kel.Prepared]
+    small: Any
+    scale: float  # of the small copy
+    reason: str
+    size: int  # bytes, about
+
+
+# ---- What runs in a worker --------------------------------------------------------------------------------------------------
+
+_kept: "collections.OrderedDict[Tuple[str, int, int], Picture]" = collections.OrderedDict()  # the last used are the last
+_lock = threading.Lock()
+
+
+def _load(path: str, settings: Settings) -> Picture:
+    try:
+        image = kel.read(path)
+        prepared = kel.prepare(image, settings.features, settings.working_size)
+        if image.dtype == np.int16:
+            image = kel.convert(image, "GREY16", "GREY")
+        if image.ndim == 3:
+            image = kel.convert(image, "RGB" if image.shape[2] == 3 else "RGBA", "GREY")
+        height, width = image.shape
+        scale = min(1.0, THUMBNAIL / max(height, width))
+        small = kel.resize(image, (max(1, round(width * scale)), max(1, round(height * scale))))
+        worked = min(width * height, settings.working_size * settings.working_size)
+        return Picture(prepared, small, scale, "", 12 * worked + 400 * settings.features)
+    except Exception as error:  # whatever a file may lead to is a reason, and not the end of the run
+        return Picture(None, None, 1.0, f"{path}: {error or type(error).__name__}", 1000)
+
+
+def _picture(path: str, settings: Settings) -> Tuple[Picture, int]:
+    """The picture, and 1 where it had to be read: where it is not among those kept. The longest unused go where there are too many."""
+    key = (path, settings.features, settings.working_size)
+    with _lock:
+        if key in _kept:
+            _kept.move_to_end(key)
+            return _kept[key], 0
+    made = _load(path, settings)
+    with _lock:
+        _kept[key] = made
+        total = sum(picture.size for picture in _kept.values())
+        while total > settings.memory and len(_kept) > 2:
+            total -= _kept.popitem(last=False)[1].size
+    return made, 1
+
+
+def _small(first: Picture, second: Picture, homography: Any) -> bytes:
+    """The first picture laid over the second one, or beside it without a homography, as a JPEG."""
+    from PIL import Image
+
+    if homography is None:
+        height = max(first.small.shape[0], second.small.shape[0])
+        both = np.hstack([np.pad(p.small, ((0, height - p.small.shape[0]), (0, 0))) for p in (first, second)])
+    else:
+        down, up = np.diag([second.scale, second.scale, 1]), np.diag([1 / first.scale, 1 / first.scale, 1])
+        size = second.small.shape[::-1]
+        try:
+            laid = kel.warp(first.small, down @ homography @ up, size)
+        except ValueError:
+            laid = second.small
+        both = np.dstack([laid, second.small, second.small])  # what differs is coloured
+    file = io.BytesIO()
+    Image.fromarray(np.ascontiguousarray(both)).save(file, "JPEG", quality=70)
+    return file.getvalue()
+
+
+def register_batch(pairs: Sequence[Pair], settings: Settings) -> Tuple[List[Row], int]:
+    """A row of results.csv and a small picture for each pair, and how many pictures were read for them."""
+    rows, read = [], 0
+    for pair in pairs:
+        start = time.perf_counter()
+        first, new_first = _picture(pair.first, settings)
+        second, new_second = _picture(pair.second, settings)
+        read += new_first + new_second
+        numbers, agreement, inliers, reason, shown = [""] * 9, "", "", first.reason or second.reason, b""
+        if not reason:
+            kel.seed(zlib.crc32(pair.id.encode()))  # the same result wherever and whenever it is computed
+            homography = None
+            try:
+                found = kel.register(first.prepared, second.prepared, settings.threshold, settings.features, settings.working_size)
+                homography = found.homography
+                numbers = [f"{value:.9g}" for value in homography.flat]
+                agreement, inliers = f"{found.agreement:.4f}", str(found.inliers)
+            except kel.NotRegistered as error:
+                reason = error.reason
+            shown = _small(first, second, homography)
+        milliseconds = f"{1000 * (time.perf_counter() - start):.1f}"
+        rows.append(([pair.id, str(int(not reason)), *numbers, agreement, inliers, milliseconds, " ".join(reason.split())], shown))
+    return rows, read
+
+
+def _version() -> str:
+    return kel.__version__
+
+
+# ---- Files ------------------------------------------------------------------------------------------------------------------
+
+
+class Refused(Exception):
+    """What the user has to mend; the message says it."""
+
+
+def read_pairs(path: str) -> List[Pair]:
+    """The pairs of a file with columns first, second and, perhaps, id. Pictures are named from the folder of the file."""
+    folder = os.path.dirname(os.path.abspath(path))
+    pairs, seen = [], set()
+    try:
+        with open(path, newline="", encoding="utf-8-sig") as file:
+            table = csv.DictReader(file)
+            for column in ("first", "second"):
+                if column not in (table.fieldnames or []):
+                    raise Refused(f"{path}: there is no column '{column}'")
+            for number, row in enumerate(table, 1):
+                name = row["id"] if "id" in row else str(number)
+                if not name or not row["first"] or not row["second"]:
+                    raise Refused(f"{path}: pair {number} is not complete")
+                if name in seen or not name.isprintable():
+                    raise Refused(f"{path}: the id of pair {number}, {name!r}, is {'there twice' if name in seen else 'not printable'}")
+                seen.add(name)
+                pairs.append(Pair(name, os.path.join(folder, row["first"]), os.path.join(folder, row["second"])))
+    except (OSError, UnicodeDecodeError, csv.Error) as error:
+        raise Refused(f"{path}: {error}") from error
+    return pairs
+
+
+class Results:
+    """results.csv and the small pictures beside it. Only whole rows count; whoever has them open keeps others out."""
+
+    def __init__(self, folder: str) -> None:
+        try:
+            os.makedirs(os.path.join(folder, "pictures"), exist_ok=True)
+            self.folder, self.path = folder, os.path.join(folder, "results.csv")
+            self.file = open(self.path, "a+b")
+            fcntl.flock(self.file, fcntl.LOCK_EX | fcntl.LOCK_NB)
+        except BlockingIOError as error:
+            raise Refused(f"{self.path}: another run is at it") from error
+        except OSError as error:
+            raise Refused(f"{folder}: {error}") from error
+        self.file.seek(0)
+        content = self.file.read()
+        whole = content[:content.rfind(b"\n") + 1]
+        rows = list(csv.reader(io.StringIO(whole.decode("utf-8", "replace"), newline="")))
+        if rows and (rows[0] != HEADER or any(len(row) != len(HEADER) for row in rows)):
+            raise Refused(f"{self.path}: this is no file of kel.batch's")
+        if not rows and content.strip(b"\0") and not ",".join(HEADER).encode().startswith(content):
+            raise Refused(f"{self.path}: this is no file of kel.batch's")
+        self.file.truncate(len(whole))  # a row that a crash cut
+        self.rows = rows[1:]
+        if not rows:
+            self._append([HEADER])
+
+    def _append(self, rows: Sequence[List[str]]) -> None:
+        text = io.StringIO(newline="")
+        csv.writer(text, lineterminator="\n").writerows(rows)
+        self.file.write(text.getvalue().encode())
+        self.file.flush()
+        os.fsync(self.file.fileno())
+
+    def add(self, rows: Sequence[Row]) -> None:
+        for row, shown in rows:
+            if shown:
+                with open(os.path.join(self.folder, picture_of(row[0])), "wb") as file:
+                    file.write(shown)
+        self._append([row for row, _ in rows])
+        self.rows.extend(row for row, _ in rows)
+
+
+def picture_of(name: str) -> str:
+    return f"pictures/{hashlib.sha256(name.encode()).hexdigest()[:24]}.jpg"
+
+
+PAGE = """<!DOCTYPE html><html lang="en"><meta charset="utf-8"><title>Registrations</title>
+<style>body{font:14px sans-serif;margin:2em}table{border-collapse:collapse}td,th{padding:3px 10px;border-bottom:1px solid #ddd;
+text-align:left}th{cursor:pointer;background:#eee;position:sticky;top:0}img{max-height:120px}rect{fill:#47a}</style>
+<h1>%(found)d of %(all)d pairs registered</h1>
+<figure><svg width="460" height="150" role="img">%(bars)s</svg><figcaption>Pairs by agreement, 0 to 1</figcaption></figure>
+<table><thead><tr><th>id<th>found<th>agreement<th>inliers<th>milliseconds<th>reason<th>pictures</tr></thead><tbody>
+%(rows)s
+</tbody></table>
+<script>
+for (const [i, head] of [...document.querySelectorAll("th")].entries()) head.onclick = () => {
+  const body = document.querySelector("tbody"), up = head.dataset.up = head.dataset.up === "1" ? "0" : "1";
+  const of = row => row.cells[i].textContent, compare = (a, b) => {
+    if (a === "" || b === "") return (a === "") - (b === "");
+    return (isNaN(a) || isNaN(b) ? a.localeCompare(b) : a - b) * (up === "1" ? 1 : -1); };
+  body.append(...[...body.rows].sort((a, b) => compare(of(a), of(b)))); };
+</script></html>
+"""
+
+
+def write_page(results: Results) -> None:
+    """index.html: a table that sorts itself, a histogram, small pictures; nothing in it comes from elsewhere."""
+    bins = [0] * 20
+    rows = []
+    for row in results.rows:
+        values = dict(zip(HEADER, row))
+        if values["agreement"]:
+            bins[min(19, int(float(values["agreement"]) * 20))] += 1
+        picture = picture_of(row[0])
+        shown = f'<img loading="lazy" alt="" src="{picture}">' if os.path.exists(os.path.join(results.folder, picture)) else ""
+        cells = (html.escape(values[name]) for name in ("id", "found", "agreement", "inliers", "milliseconds", "reason"))
+        rows.append("<tr>" + "".join(f"<td>{cell}</td>" for cell in cells) + f"<td>{shown}</td></tr>")
+    highest = max(1, *bins)
+    bars = "".join(f'<rect x="{20 + 21 * i}" y="{130 - 120 * n / highest:.1f}" width="19" height="{120 * n / highest:.1f}">'
+                   f"<title>{i / 20:.2f} to {(i + 1) / 20:.2f}: {n}</title></rect>" for i, n in enumerate(bins))
+    bars += "".join(f'<text x="{20 + 420 * i}" y="147" text-anchor="middle">{i}</text>' for i in (0, 0.5, 1))
+    page = PAGE % {"found": sum(row[1] == "1" for row in results.rows), "all": len(rows), "bars": bars, "rows": "\n".join(rows)}
+    with tempfile.NamedTemporaryFile("w", dir=results.folder, delete=False, encoding="utf-8") as file:
+        file.write(page)
+    os.chmod(file.name, 0o644)
+    os.replace(file.name, os.path.join(results.folder, "index.html"))
+
+
+# ---- The run ----------------------------------------------------------------------------------------------------------------
+
+
+class Bar:
+    """How far it is, on standard error: one line that is written over on a terminal, a few lines elsewhere."""
+
+    def __init__(self, done: int, of: int) -> None:
+        self.before, self.of, self.start, self.last = done, of, time.monotonic(), -1.0
+
+    def show(self, done: int, found: int, end: bool = False) -> None:
+        now, live = time.monotonic(), sys.stderr.isatty()
+        if not end and now - self.last < (0.2 if live else 10):
+            return
+        self.last = now
+        rate = (done - self.before) / max(1e-9, now - self.start)
+        filled = 30 * done // max(1, self.of)
+        line = f"[{'#' * filled}{'.' * (30 - filled)}] {done} of {self.of} pairs, {found} registered, {rate:.1f} a second"
+        print(("\r\033[K" if live else "") + line, end="\n" if end or not live else "", file=sys.stderr, flush=True)
+
+
+def connect(arguments: argparse.Namespace, folder: str) -> Any:
+    try:
+        import dask
+        from distributed import Client, LocalCluster
+    except ImportError as error:
+        raise Refused(f"this takes Dask's distributed scheduler (Debian's python3-distributed): {error}") from error
+    for name in list(logging.root.manager.loggerDict):
+        if name.split(".")[0] in ("distributed", "tornado"):
+            logging.getLogger(name).setLevel(logging.CRITICAL)  # what goes wrong is said here
+    try:
+        if arguments.scheduler:
+            client = Client(arguments.scheduler, timeout=5)
+            client.wait_for_workers(1, timeout=60)
+            theirs = client.submit(_version, pure=False).result(timeout=60)
+            if theirs != kel.__version__:
+                raise Refused(f"{arguments.scheduler}: the workers have kel {theirs}, this is {kel.__version__}")
+            return client
+        dask.config.set({"temporary-directory": folder, "distributed.worker.daemon": True})
+        cluster = LocalCluster(n_workers=arguments.workers, threads_per_worker=1, processes=True, dashboard_address=None,
+                               memory_limit=0, local_directory=folder, silence_logs=logging.CRITICAL)
+        return Client(cluster)
+    except (OSError, TimeoutError, ImportError, ValueError) as error:
+        raise Refused(f"{arguments.scheduler or 'workers'}: {error}") from error
+
+
+class Queues:
+    """Batches of pairs, a share for each worker: neighbours have pictures in common, which a worker then reads once."""
+
+    def __init__(self, batches: List[List[Pair]], workers: Sequence[str]) -> None:
+        count = len(workers)
+        self.shares = {worker: collections.deque(batches[i * len(batches) // count:(i + 1) * len(batches) // count])
+                       for i, worker in enumerate(workers)}
+
+    def __bool__(self) -> bool:
+        return any(self.shares.values())
+
+    def take(self, worker: str) -> List[Pair]:
+        """The worker's next; where it has none left, the last of who has most, so that the other's go on being neighbours."""
+        own = self.shares.setdefault(worker, collections.deque())
+        return own.popleft() if own else max(self.shares.values(), key=len).pop()
+
+    def add(self, batch: List[Pair]) -> None:
+        next(iter(self.shares.values())).append(batch)
+
+
+def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, results: Results, bar: Bar) -> int:
+    """Batches of pairs to the workers, few enough at a time that little is in flight; rows as they come. How many pictures were read."""
+    from concurrent.futures import CancelledError
+
+    from distributed import KilledWorker, wait
+
+    lost = Refused("the scheduler is gone; run the same again, and it goes on from here")
+    queues = Queues([pairs[i:i + batch] for i in range(0, len(pairs), batch)], list(client.nthreads()))
+    flying: Dict[Any, Tuple[List[Pair], str]] = {}
+    found, read = sum(row[1] == "1" for row in results.rows), 0
+    while queues or flying:
+        busy = collections.Counter(worker for _, worker in flying.values())
+        for worker, threads in client.nthreads().items():
+            while queues and busy[worker] < 2 * threads:
+                some = queues.take(worker)
+                future = client.submit(register_batch, some, settings, pure=False, workers=[worker], allow_other_workers=True)
+                flying[future] = some, worker
+                busy[worker] += 1
+        if not flying:
+            print("no workers; waiting for some", file=sys.stderr)
+            time.sleep(10)
+        try:
+            done = wait(list(flying), timeout=5, return_when="FIRST_COMPLETED").done if flying else set()
+        except TimeoutError:
+            done = set()
+        except CancelledError:
+            raise lost from None
+        for future in done:
+            some, _ = flying.pop(future)
+            if future.status == "finished":
+                rows, new = future.result()
+                read += new
+            elif future.status == "error" and len(some) > 1:
+                for pair in some:
+                    queues.add([pair])  # which of them it is will show
+                continue
+            elif future.status == "error":
+                error = future.exception()
+                died = isinstance(error, KilledWorker)
+                reason = "the workers that tried it died" if died else f"{type(error).__name__}: {error}"
+                rows = [([some[0].id, "0", *[""] * 9, "", "", "", " ".join(reason.split())], b"")]
+            else:
+                raise lost
+            results.add(rows)
+            found += sum(row[1] == "1" for row, _ in rows)
+            bar.show(len(results.rows), found)
+        if client.status not in ("running", "connecting"):
+            raise lost
+    bar.show(len(results.rows), found, end=True)
+    return read
+
+
+def run(pairs: List[Pair], settings: Settings, arguments: argparse.Namespace, results: Results) -> None:
+    with tempfile.TemporaryDirectory(prefix="kel-batch-", ignore_cleanup_errors=True) as folder:
+        client = connect(arguments, folder)
+        try:
+            bar = Bar(len(results.rows), len(results.rows) + len(pairs))
+            read = distribute(client, pairs, settings, arguments.batch, results, bar)
+            print(f"{len({path for pair in pairs for path in pair[1:]})} pictures, read {read} times", file=sys.stderr)
+        finally:
+            cluster = client.cluster  # ours
+            client.close()
+            if cluster is not None:
+                cluster.close()
+
+
+def by_picture(pairs: List[Pair]) -> List[Pair]:
+    """Pairs in an order that brings those of the same pictures together, whatever the order in the file."""
+    place: Dict[str, int] = {}
+    for pair in pairs:
+        for path in (pair.first, pair.second):
+            place.setdefault(path, len(place))
+    return sorted(pairs, key=lambda pair: sorted((place[pair.first], place[pair.second])))
+
+
+def main(words: Optional[Sequence[str]] = None) -> int:
+    parser = argparse.ArgumentParser(prog="python3 -m kel.batch", description="Registers many pairs of pictures.")
+
+    def whole(low: int, high: int) -> Any:
+        def parse(text: str) -> int:
+            if not text.isdecimal() or not low <= int(text) <= high:
+                raise argparse.ArgumentTypeError(f"a number from {low} to {high}, not '{text}'")
+            return int(text)
+        return parse
+
+    def distance(text: str) -> float:
+        try:
+            if 0.1 <= float(text) <= 100:
+                return float(text)
+        except ValueError:
+            pass
+        raise argparse.ArgumentTypeError(f"a number from 0.1 to 100, not '{text}'")
+
+    parser.add_argument("pairs", metavar="PAIRS.csv", help="columns first, second (pictures, from this file's folder) and, perhaps, id")
+    parser.add_argument("--output", metavar="DIR", required=True, help="folder for results.csv and index.html; goes on where it has some")
+    parser.add_argument("--scheduler", metavar="tcp://...", help="a Dask cluster that is there; its workers see the same folders")
+    parser.add_argument("--workers", type=whole(1, 1000), default=len(os.sched_getaffinity(0)), help="processes here (all cores)")
+    parser.add_argument("--batch", type=whole(1, 1000), default=8, help="pairs a task (8)")
+    parser.add_argument("--memory", type=whole(1, 1000000), default=500, help="MB of pictures that a worker keeps ready (500)")
+    parser.add_argument("--threshold", type=distance, default=3.0, help="distance at which matches fit, pixels (3)")
+    parser.add_argument("--features", type=whole(50, 5000), default=1200, help="most keypoints a picture (1200)")
+    parser.add_argument("--working-size", type=whole(200, 8000), default=1000, help="pictures are halved to this (1000)")
+    arguments = parser.parse_args(words)
+    settings = Settings(arguments.threshold, arguments.features, arguments.working_size, arguments.memory * 1000000)
+    try:
+        pairs = read_pairs(arguments.pairs)
+        results = Results(arguments.output)
+        done = {row[0] for row in results.rows}
+        left = by_picture([pair for pair in pairs if pair.id not in done])
+        if done:
+            print(f"{len(pairs) - len(left)} of {len(pairs)} pairs are there already", file=sys.stderr)
+        try:
+            if left:
+                run(left, settings, arguments, results)
+        finally:
+            write_page(results)
+    except Refused as error:
+        print(f"kel.batch: {error}", file=sys.stderr)
+        return 1
+    except KeyboardInterrupt:
+        print("\nkel.batch: broken off; run the same again, and it goes on from here", file=sys.stderr)
+        return 130
+    print(os.path.join(arguments.output, "index.html"))
+    return 0
+
+
+if __name__ == "__main__":
+    from kel import batch  # under its own name, by which workers find it
+
+    sys.exit(batch.main())
