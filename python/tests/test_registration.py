@@ -1,5 +1,8 @@
 """Fits, registration and files."""
 
+import os
+import subprocess
+import sys
 import threading
 
 import numpy as np
@@ -137,3 +140,9 @@ def test_threads():
         thread.join()
     for a, b in zip(got, expected):
         np.testing.assert_array_equal(a, b)
+
+
+def test_example(tmp_path):
+    example = os.path.join(os.path.dirname(__file__), "..", "examples", "notebook.py")
+    printed = subprocess.run([sys.executable, example, tmp_path], capture_output=True, text=True, check=True).stdout
+    assert float(printed.split("off by at most ")[1].split()[0]) < 1 and (tmp_path / "laid-over.png").stat().st_size > 1000
