@@ -42,7 +42,7 @@ def build_wheel(wheel_directory, config_settings=None, metadata_directory=None):
         subprocess.run(["cmake", "--build", os.path.join(work, "build"), "--target", "kel_python"], check=True)
         files = {}
         for file in sorted(os.listdir(os.path.join(built, "kel"))):
-            if file.endswith((".py", ".so", ".typed")):
+            if file.endswith((".py", ".pyi", ".so", ".typed")):
                 with open(os.path.join(built, "kel", file), "rb") as opened:
                     files[f"kel/{file}"] = opened.read()
     files[f"{info}/METADATA"] = _metadata().encode()

@@ -11,9 +11,11 @@ from kel._geometry import decompose_camera, find_homography, find_projection, se
 from kel._images import (
     add_border, add_noise, adaptive_threshold, convert, crop_border, cross, flip, gaussian, halve, keypoints, rank_filter, resize,
     sobel, stretch_contrast, threshold, warp)
-from kel._kel import version as __version__
+from kel._kel import version
 from kel._registration import (
     NotRegistered, Prepared, Registration, find_features, match_features, prepare, register)
+
+__version__ = version
 
 __all__ = [
     "NotRegistered", "Prepared", "Registration", "add_border", "add_noise", "adaptive_threshold", "convert", "crop_border", "cross",

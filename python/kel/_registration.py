@@ -7,9 +7,8 @@ import numpy as np
 from numpy.typing import NDArray
 
 from kel import _kel
-from kel._images import Image, convert, resize, warp
-
-Prepared = _kel.Prepared
+from kel._images import Format, Image, convert, resize, warp
+from kel._kel import Prepared
 
 
 class NotRegistered(RuntimeError):
@@ -75,7 +74,8 @@ def _to_rgb(image: Image) -> Image:
     if image.ndim == 2 and image.dtype == np.int16:  # over its own range, as register() takes it
         low, high = int(image.min()), int(image.max())
         image = ((image.astype(np.int32) - low) * 255 // max(1, high - low)).astype(np.uint8)
-    return convert(image, "GREY" if image.ndim == 2 else {2: "UYVY", 3: "RGB", 4: "RGBA"}[image.shape[2]], "RGB")
+    formats: "dict[int, Format]" = {2: "UYVY", 3: "RGB", 4: "RGBA"}
+    return convert(image, "GREY" if image.ndim == 2 else formats[image.shape[2]], "RGB")
 
 
 def register(first: Union[Image, Prepared], second: Union[Image, Prepared], threshold: float = 3.0, features: int = 1200,

@@ -47,7 +47,7 @@ class Settings(NamedTuple):
 class Picture(NamedTuple):
     """A picture as workers keep it: made ready once, with a small copy, or the reason why it is none."""
 
-    prepared: Optional[kel.Prepared]
+    prepared: Any  # kel.Prepared, or None
     small: Any
     scale: float  # of the small copy
     reason: str

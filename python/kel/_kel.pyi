@@ -1,0 +1,9 @@
+# The compiled module: functions that take any objects, check them, and are documented where kel/*.py wraps them.
+from typing import Any
+
+version: str
+
+class Prepared:
+    """A picture made ready for several registrations, by prepare()."""
+
+def __getattr__(name: str) -> Any: ...
