@@ -100,7 +100,7 @@ public:
     // Masks at the end of a row read on into the rows below, of which there are enough.
     void row(kelValue_s32 y) {
         const int16_t* const response = kel::row<int16_t>(m_laplacian, y);
-        const kelValue_s32 end = m_laplacian->width - kBorder;
+        const kelValue_s32 end = kel::lessReach(m_laplacian->width, kBorder);
         for (kelValue_s32 first = kBorder; first < end; first += kMasks * kBlock) {
             uint64_t masks[kMasks];
             const kelValue_s32 count = std::min((end - first + kBlock - 1) / kBlock, kMasks);
@@ -160,7 +160,7 @@ extern "C" kelValue_s32 applyKelDetectorKeypointYape(kelKeypoint2DF32_t* keypoin
     if (gaussian->type != KEL_PIXEL_TYPE_U8G)
         return 0;
     Scan scan(gaussian, laplacian, keypoints, max);
-    for (kelValue_s32 y = kBorder; y < gaussian->height - kBorder; ++y)
+    for (kelValue_s32 y = kBorder; y < kel::lessReach(gaussian->height, kBorder); ++y)
         scan.row(y);
     return scan.count();
 }

@@ -74,7 +74,7 @@ void kel::enlarge(kelImage_t* dst, const kelImage_t* src) {
             std::swap(above, below);
             interpolated(below, current + 1);
         }
-        kernels.mixRows(rowByWidth<uint8_t>(dst, 4 * y), reinterpret_cast<const uint8_t*>(above.get()),
+        kernels.mixRows(reinterpret_cast<uint8_t*>(rowByWidth<uint32_t>(dst, y)), reinterpret_cast<const uint8_t*>(above.get()),
                         reinterpret_cast<const uint8_t*>(below.get()), down.weight[y], 4 * static_cast<ptrdiff_t>(width));
     }
 }

@@ -42,11 +42,12 @@ void applyKelFilterGaussian5X5_downsampling(kelImage_t* dst, kelImage_t* half, k
     // Row y across, then row y - kReach down while its five rows are still in the cache. Row y of the source is read before row
     // y - kReach of the destination is written, so the two may be one image.
     const kel::Kernels& kernels = kel::kernels();
-    for (kelValue_s32 y = 0; y < dst->height + kReach; ++y) {
+    for (int64_t y = 0; y < dst->height + int64_t(kReach); ++y) {
+        const kelValue_s32 across = static_cast<kelValue_s32>(y), down = static_cast<kelValue_s32>(y - kReach);
         if (y < dst->height)
-            kernels.fiveAcross(kel::row<int16_t>(tmp, y), kel::row<uint8_t>(src, y), dst->width);
+            kernels.fiveAcross(kel::row<int16_t>(tmp, across), kel::row<uint8_t>(src, across), dst->width);
         if (y >= kReach)
-            smoothRow(kernels, dst, half, tmp, y - kReach);
+            smoothRow(kernels, dst, half, tmp, down);
     }
 }
 

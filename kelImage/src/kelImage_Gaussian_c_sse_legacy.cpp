@@ -48,7 +48,7 @@ void applyKelFilterGaussianSSE7X7_downsampling(kelImage_t* dst, kelImage_t* half
     };
     // Two rows down as soon as their scratch rows are there, while these are still in the cache. A source row has been read
     // before the destination row of its number is written, so the two may be one image.
-    const kelValue_s32 rowsEnd = dst->height - kReach;
+    const kelValue_s32 rowsEnd = kel::lessReach(dst->height, kReach);
     for (kelValue_s32 y = kReach; y < rowsEnd; y += 2) {
         const kelValue_s32 rows = std::min(rowsEnd - y, 2);
         acrossUpTo(y + rows + kReach);

@@ -17,6 +17,6 @@ extern "C" void applyKelFilterLaplacianSSE3X3(kelImage_t* dst, kelImage_t* src) 
     KEL_ASSERT(dst->type == KEL_PIXEL_TYPE_S16G);
     const kel::Kernels& kernels = kel::kernels();
     const kelValue_s32 end = kel::blocksEnd(src->width, kMargin, kBlock);
-    for (kelValue_s32 y = kReach; y < src->height - kReach; ++y)
+    for (kelValue_s32 y = kReach; y < kel::lessReach(src->height, kReach); ++y)
         kernels.crossRow(kel::row<int16_t>(dst, y), kel::row<uint8_t>(src, y), src->step, kReach, kMargin, end);
 }

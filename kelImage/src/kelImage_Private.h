@@ -35,6 +35,11 @@ template <class Body> inline void withPixel(kelValue_s32 type, Body body) {
     }
 }
 
+// Where rows or columns end that have `reach` others behind them; a negative size of any magnitude has none.
+inline kelValue_s32 lessReach(kelValue_s32 size, kelValue_s32 reach) {
+    return size > reach ? size - reach : 0;
+}
+
 // Pixel (0, y) in elements of T, rows `step` pixels apart; T is a whole pixel, or `perPixel` of them make one.
 template <class T> inline T* row(kelImage_t* image, kelValue_s32 y, int perPixel = 1) {
     return reinterpret_cast<T*>(image->data) + static_cast<ptrdiff_t>(y) * image->step * perPixel;

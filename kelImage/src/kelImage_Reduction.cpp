@@ -171,6 +171,6 @@ void kel::reduce(kelImage_t* dst, const kelImage_t* src) {
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         for (; reduced <= down.lastOf(y); ++reduced)
             across(rowAt(reduced), rowByWidth<uint32_t>(src, reduced));
-        down(rowByWidth<uint8_t>(dst, 4 * y), y, 4 * static_cast<ptrdiff_t>(dst->width), rowAt);
+        down(reinterpret_cast<uint8_t*>(rowByWidth<uint32_t>(dst, y)), y, 4 * static_cast<ptrdiff_t>(dst->width), rowAt);
     }
 }

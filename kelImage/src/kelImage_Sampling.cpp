@@ -38,6 +38,7 @@ template <class P> void decimateRow(const Kernels& kernels, P* dst, const P* src
 
 template <class P> void nearest(kelImage_t* dst, const kelImage_t* src) {
     const kelValue_s32 rx = src->width / dst->width, ry = src->height / dst->height;
+    __asm__ volatile("" ::"r"(rx), "r"(ry)); // an empty destination divides by zero here, whether the ratio is needed or not
     if (dst->width < 0)
         return;
     const Kernels& kernels = kel::kernels();

@@ -20,6 +20,6 @@ extern "C" void applyKelFilterSobelSSE3X3(kelImage_t* dst, kelImage_t* src) {
     if (end == kMargin)
         return;
     const kel::Kernels& kernels = kel::kernels();
-    for (kelValue_s32 y = kReach; y < src->height - kReach; ++y)
+    for (kelValue_s32 y = kReach; y < kel::lessReach(src->height, kReach); ++y)
         kernels.sobelRow(kel::row<int16_t>(dst, y), kel::row<uint8_t>(src, y), src->step, kMargin, end);
 }

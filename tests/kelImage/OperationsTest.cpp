@@ -191,6 +191,25 @@ TEST(ImageOperations, NeedNoPaddingWhereTheyPromiseIt) {
     });
 }
 
+TEST(ImageOperations, DoNothingToNegativeHeights) {
+    const Image memory(64, 64, 0);
+    const Bytes before = memory.bytes();
+    forEveryOperation([&](const ImageOperation& o) {
+        for (int height : {INT_MIN, INT_MIN + 2, -1})
+            if (const Size same = o.size({40, 40}, o.parameters[0]);
+                same.width == 40 && same.height == 40 && o.leastWidth < 1) {
+                kelImage_t* images[] = {createKelImageHeader(40, height, o.to), createKelImageHeader(40, height, o.from),
+                                        createKelImageHeader(40, height, std::max(o.tmp, 0))};
+                for (kelImage_t* image : images)
+                    image->data = memory.data() + 2048;
+                o.call({images[0], images[1], images[2], nullptr, o.parameters[0]});
+                EXPECT_TRUE(holds(memory, before)) << height;
+                for (kelImage_t* image : images)
+                    releaseKelImageHeader(&image);
+            }
+    });
+}
+
 TEST(ImageOperations, FollowTheThreadsRoundingMode) {
     forEveryOperation([](const ImageOperation& o) {
         for (const RoundingMode& mode : kRoundingModes)

@@ -250,11 +250,15 @@ TEST(Transforms, StopOnTypesAndSizesThatDoNotFit) {
     Image half(10, 6, 0);
     EXPECT_STOPS(resizeKelImageHalf(half.get(), grey.get()), "dst->height == src->height / 2", resizer,
                  "void resizeKelImageHalf(kelImage_t*, const kelImage_t*)");
-    // The ratio comes before the check: an empty destination divides by zero whatever its type.
-    Image none(0, 4, 8);
+    // An empty destination divides by zero, whether the ratio is needed or not; in the bilinear form before the check.
+    Image none(0, 4, 8), narrow(0, 4, 0), flat(20, 0, 0);
 #ifdef __SANITIZE_ADDRESS__
-    EXPECT_DEATH(resizeKelImageBilinear(none.get(), grey.get()), "division by zero");
+#define KEL_EXPECT_DIVISION(call) EXPECT_DEATH(call, "division by zero")
 #else
-    EXPECT_EXIT(resizeKelImageBilinear(none.get(), grey.get()), testing::KilledBySignal(SIGFPE), "");
+#define KEL_EXPECT_DIVISION(call) EXPECT_EXIT(call, testing::KilledBySignal(SIGFPE), "")
 #endif
+    KEL_EXPECT_DIVISION(resizeKelImageBilinear(none.get(), grey.get()));
+    for (const Image* empty : {&narrow, &flat})
+        for (auto resize : {resizeKelImageNearest, resizeKelImageBilinear})
+            KEL_EXPECT_DIVISION(resize(empty->get(), grey.get()));
 }

@@ -209,6 +209,7 @@ void addTransforms(List& list) {
             ImageOperation& o = add(linear ? "resizeKelImageBilinear" : "resizeKelImageNearest", type,
                                     pair(linear ? resizeKelImageBilinear : resizeKelImageNearest),
                                     pair(linear ? kel_ref::bilinear : kel_ref::nearest));
+            o.rounds = true;
             o.leastWidth = 1; // ratios across: 0, an enlargement, to 7; down: another; the rest of a division stays unused
             o.heights = {1, 3, 8, 9};
             o.parameters = {1, 2, 3, 4, 5, 7, 0};
@@ -251,7 +252,7 @@ void addTransforms(List& list) {
             },
             [](const Operands& o) { kel_ref::warp(o.dst, o.src, kHomographies[o.parameter]); });
         warp.parameters = {0, 1, 2};
-        warp.withinPixels = true;
+        warp.withinPixels = warp.rounds = true;
         warp.size = [](Size src, int) { return Size{(src.width + 13) % 90, src.height + 3}; };
     }
     for (int type : {16, 32}) {
