@@ -237,7 +237,7 @@ py::array keypoints(const py::object& grey, const py::object& maximum, bool smoo
     py::array_t<Keypoint> result(std::min<py::ssize_t>(count, room));
     for (py::ssize_t i = 0; i < result.size(); ++i)
         result.mutable_data()[i] = {found[i].x, found[i].y, found[i].score};
-    return std::move(result);
+    return result;
 }
 
 namespace {
