@@ -380,10 +380,14 @@ def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, r
 def run(pairs: List[Pair], settings: Settings, arguments: argparse.Namespace, results: Results) -> None:
     with tempfile.TemporaryDirectory(prefix="kel-batch-", ignore_cleanup_errors=True) as folder:
         client = connect(arguments, folder)
+        from distributed.comm import CommClosedError
+
         try:
             bar = Bar(len(results.rows), len(results.rows) + len(pairs))
             read = distribute(client, pairs, settings, arguments.batch, results, bar)
             print(f"{len({path for pair in pairs for path in pair[1:]})} pictures, read {read} times", file=sys.stderr)
+        except CommClosedError:
+            raise Refused("the scheduler is gone; run the same again, and it goes on from here") from None
         finally:
             cluster = client.cluster  # ours
             client.close()
