@@ -632,8 +632,6 @@ bool kelMat::getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X) {
     const int n = B.m_Width;
     if (B.m_Height != n || n < 2)
         B.getInversedMatrix(); // stops the process on the size
-    if (m_Height != n || m_Width != n)
-        (void)(kelMat(n, n) * *this * kelMat(n, n)); // so does this, if there is a matrix at all
     const size_t square = elements(B);
     kel::SquareScratch L(square), M(square), N(square), C(square);
     std::copy_n(B.m_Data, square, L.data());
@@ -644,6 +642,8 @@ bool kelMat::getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X) {
         X.release();
         return true;
     }
+    if (m_Height != n || m_Width != n)
+        (void)(kelMat(n, n) * *this * kelMat(n, n)); // so does this
     kel::transpose(N.data(), M.data(), n, n);
     kel::multiply(L.data(), N.data(), m_Data, n, n, n);
     kel::multiply(C.data(), L.data(), M.data(), n, n, n);

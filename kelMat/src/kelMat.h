@@ -207,7 +207,8 @@ public:
     /// Solves (this) x = lambda B x, this matrix symmetric and B symmetric positive definite, through the Cholesky factor of B
     /// and nr_jacobi(): eigenvalues (n x 1, not sorted), B-orthonormal eigenvectors (columns). Always true: where B is not positive
     /// definite d and X come out empty, NaN or, mostly, finite and WRONG, which nothing tells. Stops as getInversedMatrix() does
-    /// where B is not square or its order is below 2, and as the product of matrices where this matrix is of another size.
+    /// where B is not square or its order is below 2, and as the product of matrices where this matrix is of another
+    /// size, unless d and X come out empty.
     KEL_API bool getGeneralizedEigenValue(kelMat& B, kelMat& d, kelMat& X);
     /// @}
 

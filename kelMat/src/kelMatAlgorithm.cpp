@@ -414,7 +414,8 @@ public:
             const float sum = offDiagonalSum();
             if (sum == 0.0f)
                 return true;
-            const float threshold = sweep < kThresholdSweeps ? 0.2f * sum / static_cast<float>(n * n) : 0.0f;
+            const float threshold =
+                sweep < kThresholdSweeps ? 0.2f * sum / static_cast<float>(static_cast<ptrdiff_t>(n) * n) : 0.0f;
             for (int p = 0; p < n - 1; ++p)
                 for (int q = p + 1; q < n; ++q)
                     *rotations += visit(p, q, sweep > kShortcutSweep, threshold);

@@ -31,7 +31,7 @@ struct Model {
     static void fitSample(kelMat& P, const Set& set) {
         int i[kSample];
         getRandomIndex(set.m_Num, i[0], i[1], i[2], i[3], i[4], i[5]);
-        float rows[kSample][2 * kUnknowns];
+        alignas(16) float rows[kSample][2 * kUnknowns];
         for (int k = 0; k < kSample; ++k)
             fillRows(rows[k], set, i[k]);
         kel::solveRows<Model>(P, rows[0], kSample);

@@ -18,7 +18,8 @@ namespace kel {
 // theta = the right singular vector of the smallest singular value of A (rows x N); of equal ones the first. A is left with nothing
 // of use.
 template <int N> void smallestSingularVector(float* A, int rows, float* theta) {
-    float w[N], v[N * N];
+    float w[N];
+    alignas(16) float v[N * N];
     decomposeSV(A, rows, N, A, false, w, v);
     int k = 0;
     for (int i = 1; i < N; ++i)

@@ -133,7 +133,7 @@ struct LUCopy {
 
 // Singular value decomposition of a (m x n), which is u itself or apart from it: n singular values in w, v n x n. With `withU` u
 // (m x n) becomes the matrix of the left singular vectors; without, it is left with nothing of use, which costs about half, and
-// w and v have the same bits. False where a value does not converge.
+// w and v have the same bits. u and v are aligned to 16 bytes. False where a value does not converge.
 bool decomposeSV(const float* a, int m, int n, float* u, bool withU, float* w, float* v);
 
 } // namespace kel

@@ -419,6 +419,7 @@ TEST(GeneralizedEigen, ComesOutEmptyWhereTheSecondMatrixHasNoInverse) {
         EXPECT_TRUE(A.getGeneralizedEigenValue(B, D, X));
         EXPECT_TRUE(sameSize(D, 0, 0));
         EXPECT_TRUE(sameSize(X, 0, 0));
+        EXPECT_TRUE(randomSymmetric(n + 1, 54).getGeneralizedEigenValue(B, D, X)) << "before the sizes are compared";
     }
 }
 
