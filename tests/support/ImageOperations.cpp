@@ -89,6 +89,8 @@ void addConverters(List& list) {
         {"convertKelImageSSE_U8YUV_to_U8RGB", convertKelImageSSE_U8YUV_to_U8RGB, kel_ref::nothing, 40, 24},
     };
     const auto misplaced = [](int from, int to) { return (from == 16 || from == 32) && (to == 0 || to == 3); };
+    // At odd widths the last V is padding; to four channels rows drift unless they are whole blocks.
+    const auto settledWidth = [](int from, int to) { return from != 40 ? 61 : to == 16 || to == 32 ? 64 : 62; };
     for (const auto& c : converters) {
         ImageOperation o = operation(c.name, c.from, c.to, pair(c.call), pair(c.reference));
         const bool usesPadding = c.from == 40 || c.from == 0;
@@ -97,6 +99,7 @@ void addConverters(List& list) {
         o.rounds = c.from == 40;
         o.checked = false;
         o.withinPixels = o.room == 1 && !usesPadding;
+        o.settledWidth = c.reference == kel_ref::nothing ? 0 : settledWidth(c.from, c.to);
         o.inPlace = !usesPadding && c.from - c.to == -16 && c.call != convertKelImage_U8XYZ_to_U8ZYXA;
         list.push_back(o);
     }
@@ -108,7 +111,8 @@ void addConverters(List& list) {
             o.room = misplaced(from, to) ? 3 : 1;
             o.rounds = from == 40;
             o.stride = 23; // the converters have lines of their own
-            o.settledWidth = from == 40 && (to == 16 || to == 32) ? 64 : from == 40 ? 62 : 61;
+            const bool inert = (to == 40 && from != 40) || (from == 40 && to == 3);
+            o.settledWidth = inert ? 0 : settledWidth(from, to);
             list.push_back(o);
         }
 }
@@ -232,6 +236,7 @@ void addTransforms(List& list) {
         larger.parameters = smaller.parameters = {0, 1, 2, 7, 16, 19};
         larger.leastWidth = 1;
         larger.heights = {1, 2, 5};
+        larger.settledWidth = 64; // rows by width in some types
         smaller.heights = {0, 2, 5, 40};
         const auto addFlip = [&](const char* name, Pair call, bool mirrored, bool upsideDown) {
             add(name, type, pair(call), [=](const Operands& o) {
