@@ -11,6 +11,6 @@ function(kel_library_of set)
   set_target_properties(kel_${set} PROPERTIES OUTPUT_NAME kel SOVERSION ${PROJECT_VERSION_MAJOR}
     CXX_VISIBILITY_PRESET hidden LIBRARY_OUTPUT_DIRECTORY ${PROJECT_BINARY_DIR}/kernels/${set})
 endfunction()
-foreach(set sse41 avx2 avx512)
+foreach(set IN LISTS kel_kernel_sets)
   kel_library_of(${set})
 endforeach()

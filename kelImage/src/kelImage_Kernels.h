@@ -82,6 +82,9 @@ extern const Kernels kernels;
 namespace avx512 { // F, BW, VL and VBMI
 extern const Kernels kernels;
 }
+namespace neon { // AArch64
+extern const Kernels kernels;
+}
 
 } // namespace kel
 
