@@ -4,7 +4,6 @@
 #include <cmath>
 #include <cstdio>
 #include <cstdlib>
-#include <emmintrin.h>
 
 #include "kelAssert.h"
 #include "kelMat_Private.h"
@@ -265,7 +264,7 @@ float rowTimes(const float* row, float x, float y, float z) {
 
 // Halves up, but negative values toward zero (-1.7 gives -1); callers rely on it. Beyond the range of int: INT_MIN.
 int rounded(float f) {
-    return _mm_cvttsd_si32(_mm_set_sd(static_cast<double>(f) + 0.5));
+    return kel::truncated(static_cast<double>(f) + 0.5);
 }
 
 } // namespace

@@ -3,30 +3,27 @@
 #include <algorithm>
 #include <cfloat>
 #include <cmath>
-#include <smmintrin.h>
 
 #include "kelMat_Private.h"
 
 namespace {
 
-constexpr int kLanes = 4;
+using kel::all, kel::Floats, kel::kLanes, kel::load, kel::loadAligned, kel::magnitude, kel::Mask, kel::store, kel::storeAligned,
+    kel::unless;
 
 // Rows x (4 Vectors) elements of a product, summed in registers. The rows of A are `inner` apart, those of B and R `columns`.
 template <int Rows, int Vectors>
 void multiplyBlock(float* R, const float* A, const float* B, ptrdiff_t inner, ptrdiff_t columns) {
-    __m128 sums[Rows][Vectors];
-    for (auto& row : sums)
-        for (__m128& sum : row)
-            sum = _mm_setzero_ps();
+    Floats sums[Rows][Vectors] = {};
     for (ptrdiff_t k = 0; k < inner; ++k, B += columns)
         for (int i = 0; i < Rows; ++i) {
-            const __m128 a = _mm_set1_ps(A[i * inner + k]);
+            const Floats a = all(A[i * inner + k]);
             for (int v = 0; v < Vectors; ++v)
-                sums[i][v] = _mm_add_ps(_mm_mul_ps(a, _mm_loadu_ps(B + kLanes * v)), sums[i][v]);
+                sums[i][v] = a * load(B + kLanes * v) + sums[i][v];
         }
     for (int i = 0; i < Rows; ++i)
         for (int v = 0; v < Vectors; ++v)
-            _mm_storeu_ps(R + i * columns + kLanes * v, sums[i][v]);
+            store(R + i * columns + kLanes * v, sums[i][v]);
 }
 
 // The columns that do not fill a vector.
@@ -358,37 +355,30 @@ KEL_INLINE inline JacobiRotation jacobiRotation(float element, float h, float g)
     return r;
 }
 
-__m128 magnitude(__m128 v) {
-    return _mm_andnot_ps(_mm_set1_ps(-0.0f), v);
-}
-
 // g - s (h + g tau) and h + s (g - h tau) for two rows, `count` a multiple of four.
 KEL_INLINE inline void rotateRows(float* x, float* y, ptrdiff_t count, const JacobiRotation& r) {
-    const __m128 s = _mm_set1_ps(r.s), tau = _mm_set1_ps(r.tau);
+    const Floats s = all(r.s), tau = all(r.tau);
     for (ptrdiff_t i = 0; i < count; i += kLanes) {
-        const __m128 g = _mm_load_ps(x + i), h = _mm_load_ps(y + i);
-        _mm_store_ps(x + i, _mm_sub_ps(g, _mm_mul_ps(s, _mm_add_ps(h, _mm_mul_ps(g, tau)))));
-        _mm_store_ps(y + i, _mm_add_ps(h, _mm_mul_ps(s, _mm_sub_ps(g, _mm_mul_ps(h, tau)))));
+        const Floats g = loadAligned(x + i), h = loadAligned(y + i);
+        storeAligned(x + i, g - s * (h + g * tau));
+        storeAligned(y + i, h + s * (g - h * tau));
     }
 }
 
 // The same, with the same results, for a small rotation. Its products often are subnormal, which costs the processor dearly;
 // where such a product is added to a number it cannot change, a factor of zero takes its place.
 KEL_INLINE inline void rotateRowsLittle(float* x, float* y, ptrdiff_t count, const JacobiRotation& r) {
-    const __m128 s = _mm_set1_ps(r.s), tau = _mm_set1_ps(r.tau);
-    const __m128 leastForS = _mm_set1_ps(0x1p-124f * r.theta);   // from here on a product with s is a normal number,
-    const __m128 leastForTau = _mm_set1_ps(0x1p-123f * r.theta); // with tau; s is 1 / (2 theta), tau half of it
-    const __m128 firm = _mm_set1_ps(0x1p-99f);                   // changed by no product below that
-    const auto unless = [](__m128 less, __m128 least, __m128 isFirm, __m128 v) {
-        return _mm_andnot_ps(_mm_and_ps(_mm_cmplt_ps(less, least), isFirm), v);
-    };
+    const Floats s = all(r.s), tau = all(r.tau);
+    const Floats leastForS = all(0x1p-124f * r.theta);   // from here on a product with s is a normal number,
+    const Floats leastForTau = all(0x1p-123f * r.theta); // with tau; s is 1 / (2 theta), tau half of it
+    const Floats firm = all(0x1p-99f);                   // changed by no product below that
     for (ptrdiff_t i = 0; i < count; i += kLanes) {
-        const __m128 g = _mm_load_ps(x + i), h = _mm_load_ps(y + i), sizeG = magnitude(g), sizeH = magnitude(h);
-        const __m128 firmG = _mm_cmpge_ps(sizeG, firm), firmH = _mm_cmpge_ps(sizeH, firm);
-        const __m128 a = _mm_add_ps(h, _mm_mul_ps(unless(sizeG, leastForTau, firmH, g), tau));
-        const __m128 b = _mm_sub_ps(g, _mm_mul_ps(unless(sizeH, leastForTau, firmG, h), tau));
-        _mm_store_ps(x + i, _mm_sub_ps(g, _mm_mul_ps(s, unless(magnitude(a), leastForS, firmG, a))));
-        _mm_store_ps(y + i, _mm_add_ps(h, _mm_mul_ps(s, unless(magnitude(b), leastForS, firmH, b))));
+        const Floats g = loadAligned(x + i), h = loadAligned(y + i), sizeG = magnitude(g), sizeH = magnitude(h);
+        const Mask firmG = sizeG >= firm, firmH = sizeH >= firm;
+        const Floats a = h + unless((sizeG < leastForTau) & firmH, g) * tau;
+        const Floats b = g - unless((sizeH < leastForTau) & firmG, h) * tau;
+        storeAligned(x + i, g - s * unless((magnitude(a) < leastForS) & firmG, a));
+        storeAligned(y + i, h + s * unless((magnitude(b) < leastForS) & firmH, b));
     }
 }
 

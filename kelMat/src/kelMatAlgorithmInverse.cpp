@@ -6,6 +6,8 @@
 
 namespace {
 
+using kel::all, kel::Floats, kel::store;
+
 // The adjugate over the determinant, from the rows of the matrix.
 void invert2x2(const float* a, const float* b, float det, float* R) {
     const float inverse[] = {b[1] / det, -a[1] / det, -b[0] / det, a[0] / det};
@@ -40,21 +42,19 @@ void solveIdentity(const float* LU, const int* indx, ptrdiff_t n, float* X) {
 
 // The same for order 4, a row a vector.
 void solveIdentity4(const float* LU, const int* indx, float* X) {
-    __m128 row[4] = {_mm_setr_ps(1, 0, 0, 0), _mm_setr_ps(0, 1, 0, 0), _mm_setr_ps(0, 0, 1, 0), _mm_setr_ps(0, 0, 0, 1)};
-    const auto less = [=](__m128 r, int i, int k, __m128 other) {
-        return _mm_sub_ps(r, _mm_mul_ps(_mm_set1_ps(LU[4 * i + k]), other));
-    };
+    Floats row[4] = {{1, 0, 0, 0}, {0, 1, 0, 0}, {0, 0, 1, 0}, {0, 0, 0, 1}};
+    const auto less = [=](Floats r, int i, int k, Floats other) { return r - all(LU[4 * i + k]) * other; };
     for (int i = 0; i < 3; ++i)
         std::swap(row[i], row[indx[i]]);
-    const __m128 a = row[0], b = less(row[1], 1, 0, a), c = less(less(row[2], 2, 0, a), 2, 1, b),
+    const Floats a = row[0], b = less(row[1], 1, 0, a), c = less(less(row[2], 2, 0, a), 2, 1, b),
                  d = less(less(less(row[3], 3, 0, a), 3, 1, b), 3, 2, c);
-    const auto over = [=](__m128 r, int i) { return _mm_div_ps(r, _mm_set1_ps(LU[5 * i])); };
-    const __m128 z = over(d, 3), y = over(less(c, 2, 3, z), 2), x = over(less(less(b, 1, 2, y), 1, 3, z), 1),
+    const auto over = [=](Floats r, int i) { return r / all(LU[5 * i]); };
+    const Floats z = over(d, 3), y = over(less(c, 2, 3, z), 2), x = over(less(less(b, 1, 2, y), 1, 3, z), 1),
                  w = over(less(less(less(a, 0, 1, x), 0, 2, y), 0, 3, z), 0);
-    _mm_storeu_ps(X, w);
-    _mm_storeu_ps(X + 4, x);
-    _mm_storeu_ps(X + 8, y);
-    _mm_storeu_ps(X + 12, z);
+    store(X, w);
+    store(X + 4, x);
+    store(X + 8, y);
+    store(X + 12, z);
 }
 
 // Whether no row was swapped with one above it, as a column without a candidate (all NaN) may have it.

@@ -1,25 +1,19 @@
 // The singular value decomposition behind nr_svdcmp: Householder bidiagonalisation, then implicit-shift QR. Every element goes
 // through the operations of the textbook loops in their order; only what runs side by side is arranged for vectors.
 #include <algorithm>
-#include <smmintrin.h>
 #include <type_traits>
 
 #include "kelMat_Private.h"
 
 namespace {
 
-using kel::Scratch;
-
-constexpr int kLanes = 4;
-
-__m128 magnitude(__m128 v) {
-    return _mm_andnot_ps(_mm_set1_ps(-0.0f), v);
-}
+using kel::all, kel::Floats, kel::kLanes, kel::load, kel::loadAligned, kel::magnitude, kel::Scratch, kel::store,
+    kel::storeAligned;
 
 // Lanes from .. to - 1 added one after the other.
-KEL_INLINE inline float addLanes(float sum, __m128 v, int from, int to) {
+KEL_INLINE inline float addLanes(float sum, Floats v, int from, int to) {
     alignas(16) float lanes[kLanes];
-    _mm_store_ps(lanes, v);
+    storeAligned(lanes, v);
     for (int k = from; k < to; ++k)
         sum += lanes[k];
     return sum;
@@ -36,27 +30,27 @@ template <int N> void rotate(float* tiles, ptrdiff_t tileFloats, const Rotation*
     if (begin == end)
         return;
     float* P = tiles + kLanes * begin->p;
-    __m128 carried[N];
+    Floats carried[N];
     for (int k = 0; k < N; ++k)
-        carried[k] = _mm_load_ps(P + tileFloats * k);
+        carried[k] = loadAligned(P + tileFloats * k);
     for (const Rotation* next = begin; next != end; ++next) {
         const Rotation r = *next;
         float *const first = tiles + kLanes * r.p, *const Q = tiles + kLanes * r.q;
         if (first != P)
             for (int k = 0; k < N; ++k) {
-                _mm_store_ps(P + tileFloats * k, carried[k]);
-                carried[k] = _mm_load_ps(first + tileFloats * k);
+                storeAligned(P + tileFloats * k, carried[k]);
+                carried[k] = loadAligned(first + tileFloats * k);
             }
-        const __m128 c = _mm_set1_ps(r.c), s = _mm_set1_ps(r.s);
+        const Floats c = all(r.c), s = all(r.s);
         for (int k = 0; k < N; ++k) {
-            const __m128 x = carried[k], y = _mm_load_ps(Q + tileFloats * k);
-            _mm_store_ps(first + tileFloats * k, _mm_add_ps(_mm_mul_ps(x, c), _mm_mul_ps(y, s)));
-            carried[k] = _mm_sub_ps(_mm_mul_ps(y, c), _mm_mul_ps(x, s));
+            const Floats x = carried[k], y = loadAligned(Q + tileFloats * k);
+            storeAligned(first + tileFloats * k, x * c + y * s);
+            carried[k] = y * c - x * s;
         }
         P = Q;
     }
     for (int k = 0; k < N; ++k)
-        _mm_store_ps(P + tileFloats * k, carried[k]);
+        storeAligned(P + tileFloats * k, carried[k]);
 }
 
 /*
@@ -149,7 +143,7 @@ private:
 
     void copy(float* dst, const float* src) const {
         for (ptrdiff_t i = 0; i < m_floats; i += kLanes)
-            _mm_store_ps(dst + i, _mm_load_ps(src + i));
+            storeAligned(dst + i, loadAligned(src + i));
     }
 
     // By blocks of four columns, the last of which overlaps its neighbour where the columns do not come in fours.
@@ -160,9 +154,8 @@ private:
         for (int j = 0; j < n; j += kLanes) {
             const int c = std::min(j, n - kLanes);
             const float* const from = rows + c;
-            __m128 v0 = _mm_loadu_ps(from), v1 = _mm_loadu_ps(from + n), v2 = _mm_loadu_ps(from + 2 * n),
-                   v3 = _mm_loadu_ps(from + 3 * n);
-            _MM_TRANSPOSE4_PS(v0, v1, v2, v3);
+            Floats v0 = load(from), v1 = load(from + n), v2 = load(from + 2 * n), v3 = load(from + 3 * n);
+            kel::transpose(v0, v1, v2, v3);
             storeFour(tile + kLanes * c, kLanes, v0, v1, v2, v3);
         }
     }
@@ -173,17 +166,17 @@ private:
         for (int j = 0; j < n; j += kLanes) {
             const int c = std::min(j, n - kLanes);
             const float* const from = tile + kLanes * c;
-            __m128 v0 = _mm_load_ps(from), v1 = _mm_load_ps(from + kLanes), v2 = _mm_load_ps(from + 2 * kLanes),
-                   v3 = _mm_load_ps(from + 3 * kLanes);
-            _MM_TRANSPOSE4_PS(v0, v1, v2, v3);
+            Floats v0 = loadAligned(from), v1 = loadAligned(from + kLanes), v2 = loadAligned(from + 2 * kLanes),
+                   v3 = loadAligned(from + 3 * kLanes);
+            kel::transpose(v0, v1, v2, v3);
             storeFour(rows + c, n, v0, v1, v2, v3);
         }
     }
-    static void storeFour(float* to, int pitch, __m128 v0, __m128 v1, __m128 v2, __m128 v3) {
-        _mm_storeu_ps(to, v0);
-        _mm_storeu_ps(to + pitch, v1);
-        _mm_storeu_ps(to + 2 * pitch, v2);
-        _mm_storeu_ps(to + 3 * pitch, v3);
+    static void storeFour(float* to, int pitch, Floats v0, Floats v1, Floats v2, Floats v3) {
+        store(to, v0);
+        store(to + pitch, v1);
+        store(to + 2 * pitch, v2);
+        store(to + 3 * pitch, v3);
     }
 
     const int m_rows, m_columns, m_full;
@@ -199,31 +192,31 @@ public:
     Dots(int x, int end) : m_x(kLanes * x) {
         for (int i = 0; i < kLanes * G; ++i)
             m_column[i] = kLanes * std::max(end - kLanes * G + i, 0);
-        for (__m128& sum : m_sums)
-            sum = _mm_setzero_ps();
+        for (Floats& sum : m_sums)
+            sum = Floats{};
     }
     KEL_INLINE void add(const float* tile, int from, int to) {
-        const __m128 x = _mm_load_ps(tile + m_x);
+        const Floats x = loadAligned(tile + m_x);
         for (int g = 0; g < G; ++g) {
-            __m128 row[kLanes];
+            Floats row[kLanes];
             for (int i = 0; i < kLanes; ++i)
-                row[i] = _mm_mul_ps(x, _mm_load_ps(tile + m_column[kLanes * g + i]));
-            _MM_TRANSPOSE4_PS(row[0], row[1], row[2], row[3]);
+                row[i] = x * loadAligned(tile + m_column[kLanes * g + i]);
+            kel::transpose(row[0], row[1], row[2], row[3]);
             for (int k = 0; k < kLanes; ++k)
                 if (from <= k && k < to)
-                    m_sums[g] = _mm_add_ps(m_sums[g], row[k]);
+                    m_sums[g] += row[k];
         }
     }
     // To the 4 G floats before `end`.
     void store(float* end) const {
         for (int g = 0; g < G; ++g)
-            _mm_storeu_ps(end - kLanes * (G - g), m_sums[g]);
+            kel::store(end - kLanes * (G - g), m_sums[g]);
     }
 
 private:
     const int m_x;
     int m_column[kLanes * G];
-    __m128 m_sums[G];
+    Floats m_sums[G];
 };
 
 constexpr int kMostGroups = 3;
@@ -326,7 +319,7 @@ private:
     float m_norm = 0.0f; // the largest |w| + |e|, the measure of what is negligible
 
     static size_t spaceFor(size_t n) { return kLanes * kMostGroups + n * (3 * kLanes + 2 + n); }
-    static void fill4(float* four, float x) { _mm_store_ps(four, _mm_set1_ps(x)); }
+    static void fill4(float* four, float x) { storeAligned(four, all(x)); }
     bool negligible(float x) const { return std::fabs(x) + m_norm == m_norm; }
 
     // ---- to bidiagonal form
@@ -334,18 +327,18 @@ private:
     float columnScale(int i) {
         float scale = 0.0f;
         U.fromRow(i, [&](const float* tile, int from, int to)
-                         KEL_INLINE { scale = addLanes(scale, magnitude(_mm_load_ps(tile + kLanes * i)), from, to); });
+                         KEL_INLINE { scale = addLanes(scale, magnitude(loadAligned(tile + kLanes * i)), from, to); });
         return scale;
     }
 
     // Divides column i by `scale` from row i on; returns the sum of its squares.
     float normalizeColumn(int i, float scale) {
-        const __m128 divisor = _mm_set1_ps(scale);
+        const Floats divisor = all(scale);
         float squares = 0.0f;
         U.fromRow(i, [&](float* tile, int from, int to) KEL_INLINE {
-            const __m128 x = _mm_div_ps(_mm_load_ps(tile + kLanes * i), divisor);
-            _mm_store_ps(tile + kLanes * i, x);
-            squares = addLanes(squares, _mm_mul_ps(x, x), from, to);
+            const Floats x = loadAligned(tile + kLanes * i) / divisor;
+            storeAligned(tile + kLanes * i, x);
+            squares = addLanes(squares, x * x, from, to);
         });
         return squares;
     }
@@ -366,43 +359,42 @@ private:
         const int count = n - i - 1; // columns
         const float *const factor = m_factor + kLanes * (i + 1), *const row = m_row + kLanes * (i + 1),
                            *const step = m_step + kLanes * (i + 1);
-        const __m128 scales = _mm_set1_ps(scale);
+        const Floats scales = all(scale);
         float next = 0.0f;
         const ptrdiff_t apart = U.floats();
         U.fromRowByFours(i + 1, [&, count, apart](float* tile, int from, int to, auto number) KEL_INLINE {
             constexpr int N = number;
             float *const X = tile + kLanes * i, *const A = X + kLanes;
-            __m128 x[N], sum[N];
+            Floats x[N], sum[N];
             for (int t = 0; t < N; ++t) {
-                x[t] = _mm_load_ps(X + apart * t);
-                sum[t] = _mm_setzero_ps();
+                x[t] = loadAligned(X + apart * t);
+                sum[t] = Floats{};
             }
             for (int j = 0; j < kLanes * count; j += kLanes) {
-                const __m128 f = Column ? _mm_load_ps(factor + j) : _mm_setzero_ps(),
-                             r = Row ? _mm_load_ps(row + j) : _mm_setzero_ps();
+                const Floats f = Column ? loadAligned(factor + j) : Floats{}, r = Row ? loadAligned(row + j) : Floats{};
                 for (int t = 0; t < N; ++t) {
-                    __m128 a = _mm_load_ps(A + apart * t + j);
+                    Floats a = loadAligned(A + apart * t + j);
                     if (Column) {
-                        a = _mm_add_ps(a, _mm_mul_ps(f, x[t]));
-                        _mm_store_ps(A + apart * t + j, a);
+                        a += f * x[t];
+                        storeAligned(A + apart * t + j, a);
                     }
                     if (Row)
-                        sum[t] = _mm_add_ps(sum[t], _mm_mul_ps(a, r));
+                        sum[t] += a * r;
                 }
             }
             if (Row)
                 for (int j = 0; j < kLanes * count; j += kLanes) {
-                    const __m128 s = _mm_load_ps(step + j);
+                    const Floats s = loadAligned(step + j);
                     for (int t = 0; t < N; ++t) {
                         float* const a = A + apart * t + j;
-                        _mm_store_ps(a, _mm_add_ps(_mm_load_ps(a), _mm_mul_ps(sum[t], s)));
+                        storeAligned(a, loadAligned(a) + sum[t] * s);
                     }
                 }
             for (int t = 0; t < N; ++t) {
                 if (Column)
-                    _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], scales));
+                    storeAligned(X + apart * t, x[t] * scales);
                 if (count > 0)
-                    next = addLanes(next, magnitude(_mm_load_ps(A + apart * t)), from, to);
+                    next = addLanes(next, magnitude(loadAligned(A + apart * t)), from, to);
             }
         });
         return next;
@@ -514,28 +506,28 @@ private:
     }
 
     // Column i of N tiles gives its multiples to the columns right of it and is multiplied itself.
-    template <int N> KEL_INLINE void spread(float* tiles, int i, __m128 multiplier) const {
+    template <int N> KEL_INLINE void spread(float* tiles, int i, Floats multiplier) const {
         const ptrdiff_t apart = U.floats();
         const float* const factor = m_factor + kLanes * (i + 1);
         float *const X = tiles + kLanes * i, *const A = X + kLanes;
         const int count = n - i - 1;
-        __m128 x[N];
+        Floats x[N];
         for (int t = 0; t < N; ++t)
-            x[t] = _mm_load_ps(X + apart * t);
+            x[t] = loadAligned(X + apart * t);
         for (int j = 0; j < kLanes * count; j += kLanes) {
-            const __m128 f = _mm_load_ps(factor + j);
+            const Floats f = loadAligned(factor + j);
             for (int t = 0; t < N; ++t) {
                 float* const a = A + apart * t + j;
-                _mm_store_ps(a, _mm_add_ps(_mm_load_ps(a), _mm_mul_ps(f, x[t])));
+                storeAligned(a, loadAligned(a) + f * x[t]);
             }
         }
         for (int t = 0; t < N; ++t)
-            _mm_store_ps(X + apart * t, _mm_mul_ps(x[t], multiplier));
+            storeAligned(X + apart * t, x[t] * multiplier);
     }
 
     // Step i of the left-hand transformations on the rows from i on, and with it the dot products that step i - 1 needs.
     template <int G> void spreadAndSum(int i, float multiplier) {
-        const __m128 multipliers = _mm_set1_ps(multiplier);
+        const Floats multipliers = all(multiplier);
         const ptrdiff_t apart = U.floats();
         Dots<G> sums(i - 1, n);
         const int head = i / kLanes;
@@ -570,7 +562,7 @@ private:
                 withGroups(n - i, [&](auto groups) { spreadAndSum<groups>(i, reciprocal); });
                 dots(i - 1, i - 1, n - kLanes * kMostGroups, i);
             } else {
-                const __m128 multipliers = _mm_set1_ps(reciprocal);
+                const Floats multipliers = all(reciprocal);
                 U.fromRowByFours(0, [&](float* tiles, int, int, auto number)
                                         KEL_INLINE { spread<number>(tiles, 0, multipliers); });
                 U.at(0, 0) += 1.0f;
@@ -587,9 +579,8 @@ private:
             if (l == k) {
                 if (w[k] < 0.0f) {
                     w[k] = -w[k];
-                    V.fromRow(0, [&](float* tile, int, int) {
-                        _mm_store_ps(tile + kLanes * k, _mm_xor_ps(_mm_load_ps(tile + kLanes * k), _mm_set1_ps(-0.0f)));
-                    });
+                    V.fromRow(0,
+                              [&](float* tile, int, int) { storeAligned(tile + kLanes * k, -loadAligned(tile + kLanes * k)); });
                 }
                 return true;
             }

@@ -7,7 +7,6 @@
 #include <cmath>
 #include <cstdint>
 #include <limits>
-#include <smmintrin.h>
 #include <vector>
 
 #include "kelMatInliers.h"
@@ -38,9 +37,9 @@ public:
         alignas(16) float padded[kPadded] = {};
         std::copy_n(row, N, padded);
         for (int r = 0; r < N; ++r) {
-            const __m128 factor = _mm_set1_ps(row[r]);
-            for (int c = 0; c < kPadded; c += 4)
-                _mm_store_ps(m_sum[r] + c, _mm_add_ps(_mm_mul_ps(factor, _mm_load_ps(padded + c)), _mm_load_ps(m_sum[r] + c)));
+            const Floats factor = all(row[r]);
+            for (int c = 0; c < kPadded; c += kLanes)
+                storeAligned(m_sum[r] + c, factor * loadAligned(padded + c) + loadAligned(m_sum[r] + c));
         }
     }
 
@@ -53,7 +52,7 @@ public:
     }
 
 private:
-    static constexpr int kPadded = (N + 3) / 4 * 4;
+    static constexpr int kPadded = (N + kLanes - 1) / kLanes * kLanes;
     alignas(16) float m_sum[N][kPadded];
 };
 
@@ -115,11 +114,6 @@ inline double drawsNeeded(int count, int n) {
     constexpr double kLogOfDoubt = -4.605170185988091; // ln 0.01
     const double outliers = 1.0 - static_cast<double>(count) / static_cast<double>(n);
     return kLogOfDoubt / std::log(1.0 - std::pow(1.0 - outliers, 4.0));
-}
-
-// Truncates toward zero; INT_MIN where no int holds the value.
-inline int truncated(double value) {
-    return _mm_cvttsd_si32(_mm_set_sd(value));
 }
 
 // ---- what both estimators do ------------------------------------------------------------------------------------------------

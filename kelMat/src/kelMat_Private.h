@@ -7,8 +7,8 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdlib>
-#include <smmintrin.h>
 
+#include "kelFloats.h"
 #include "kelMat.h"
 
 #define KEL_INLINE __attribute__((always_inline))
@@ -64,10 +64,10 @@ inline float determinant3x3(const float* a, const float* b, const float* c) {
 
 // to[i] -= factor * from[i].
 inline void subtractMultiple(float* to, float factor, const float* from, ptrdiff_t count) {
-    const __m128 factors = _mm_set1_ps(factor);
+    const Floats factors = all(factor);
     ptrdiff_t i = 0;
-    for (; i + 4 <= count; i += 4)
-        _mm_storeu_ps(to + i, _mm_sub_ps(_mm_loadu_ps(to + i), _mm_mul_ps(factors, _mm_loadu_ps(from + i))));
+    for (; i + kLanes <= count; i += kLanes)
+        store(to + i, load(to + i) - factors * load(from + i));
     for (; i < count; ++i)
         to[i] -= factor * from[i];
 }
@@ -77,21 +77,21 @@ inline void subtractMultiples(float* to, const float* factors, const float* rows
                               ptrdiff_t columns) {
     constexpr int kVectors = 4; // kept in registers
     ptrdiff_t c = 0;
-    for (; c + 4 * kVectors <= columns; c += 4 * kVectors) {
-        __m128 sums[kVectors];
+    for (; c + kLanes * kVectors <= columns; c += kLanes * kVectors) {
+        Floats sums[kVectors];
         for (int v = 0; v < kVectors; ++v)
-            sums[v] = _mm_loadu_ps(to + c + 4 * v);
+            sums[v] = load(to + c + kLanes * v);
         for (ptrdiff_t k = 0; k < count; ++k)
             for (int v = 0; v < kVectors; ++v)
-                sums[v] = _mm_sub_ps(sums[v], _mm_mul_ps(_mm_set1_ps(factors[k]), _mm_loadu_ps(rows + k * pitch + c + 4 * v)));
+                sums[v] -= all(factors[k]) * load(rows + k * pitch + c + kLanes * v);
         for (int v = 0; v < kVectors; ++v)
-            _mm_storeu_ps(to + c + 4 * v, sums[v]);
+            store(to + c + kLanes * v, sums[v]);
     }
-    for (; c + 4 <= columns; c += 4) {
-        __m128 sum = _mm_loadu_ps(to + c);
+    for (; c + kLanes <= columns; c += kLanes) {
+        Floats sum = load(to + c);
         for (ptrdiff_t k = 0; k < count; ++k)
-            sum = _mm_sub_ps(sum, _mm_mul_ps(_mm_set1_ps(factors[k]), _mm_loadu_ps(rows + k * pitch + c)));
-        _mm_storeu_ps(to + c, sum);
+            sum -= all(factors[k]) * load(rows + k * pitch + c);
+        store(to + c, sum);
     }
     for (; c < columns; ++c)
         for (ptrdiff_t k = 0; k < count; ++k)
