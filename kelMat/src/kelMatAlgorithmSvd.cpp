@@ -71,7 +71,7 @@ public:
           m_last(m_floats), m_spare(m_floats) {}
 
     ptrdiff_t floats() const { return m_floats; }
-    int count() const { return (m_rows + kLanes - 1) / kLanes; }
+    int count() const { return m_full + (kLanes * m_full < m_rows); }
     float* operator[](int tile) { return tile < m_full ? m_data + m_floats * tile : m_last.data(); }
     float& at(int r, int c) { return (*this)[r / kLanes][kLanes * c + r % kLanes]; }
 

@@ -31,6 +31,9 @@ extern const InlierKernels inlierKernels;
 namespace avx512 {
 extern const InlierKernels inlierKernels;
 }
+namespace neon {
+extern const InlierKernels inlierKernels;
+}
 
 // What this processor can do at its widest.
 const InlierKernels& inlierKernels();

@@ -10,27 +10,20 @@ namespace {
 using namespace kelRegister;
 
 // The arctangent of a ratio 0 .. 1 in 1/256 turns, to 0.07 of these: 32 r + r (1 - r) (9.970 + 2.7013 r).
-Lanes::Floats turnOf(Lanes::Floats ratio) {
-    using V = Lanes;
-    const V::Floats bend = V::times(V::minus(V::all(1), ratio), V::plus(V::all(9.970f), V::times(V::all(2.7013f), ratio)));
-    return V::times(ratio, V::plus(V::all(32), bend));
+Floats turnOf(Floats ratio) {
+    return ratio * (32.0f + (1.0f - ratio) * (9.970f + 2.7013f * ratio));
 }
 
 void gradients(uint16_t* out, const uint8_t* p, ptrdiff_t step, int width) {
-    using V = Lanes;
-    const V::Floats none = V::all(0);
-    for (int x = 0; x < width; x += V::kFloats, p += V::kFloats, out += V::kFloats) {
-        const V::Floats gx = V::toFloats(V::minus(V::loadWide(p + 1), V::loadWide(p - 1)));
-        const V::Floats gy = V::toFloats(V::minus(V::loadWide(p + step), V::loadWide(p - step)));
-        const V::Floats ax = V::magnitude(gx), ay = V::magnitude(gy);
-        V::Floats turn = turnOf(V::over(V::least(ax, ay), V::plus(V::most(ax, ay), V::all(1e-9f))));
-        turn = V::whereLess(ax, ay, V::minus(V::all(64), turn), turn);
-        turn = V::whereLess(gx, none, V::minus(V::all(128), turn), turn);
-        turn = V::whereLess(gy, none, V::minus(V::all(256), turn), turn);
-        const V::Floats square = V::plus(V::times(gx, gx), V::times(gy, gy));
-        const V::Ints strength = V::truncated(V::plus(V::times(V::root(square), V::all(2)), V::all(0.5f)));
-        const V::Ints direction = V::both(V::truncated(turn), V::allInts(255));
-        V::storeLowHalves(out, V::either(V::least(strength, V::allInts(255)), V::shiftedUp8(direction)));
+    for (int x = 0; x < width; x += kFloats, p += kFloats, out += kFloats) {
+        const Floats gx = toFloats(loadWide(p + 1) - loadWide(p - 1)), gy = toFloats(loadWide(p + step) - loadWide(p - step));
+        const Floats ax = magnitude(gx), ay = magnitude(gy);
+        Floats turn = turnOf(least(ax, ay) / (most(ax, ay) + 1e-9f));
+        turn = ax < ay ? 64.0f - turn : turn;
+        turn = gx < 0.0f ? 128.0f - turn : turn;
+        turn = gy < 0.0f ? 256.0f - turn : turn;
+        const Ints strength = truncated(root(gx * gx + gy * gy) * 2.0f + 0.5f), direction = truncated(turn) & 255;
+        storeLowHalves(out, least(strength, Ints{} + 255) | direction << 8);
     }
 }
 
@@ -77,34 +70,29 @@ void describe(float* cells, const float* strengths, const uint8_t* grid, const f
 
 int differences(int* found, int* sums, const uint8_t* description, const uint8_t* others, const int* limits, int limit,
                 int count) {
-    using V = Lanes;
-    constexpr int kParts = kDescription / V::kBytes;
-    V::Bytes own[kParts];
+    constexpr int kParts = kDescription / kVector;
+    Bytes own[kParts];
     for (int i = 0; i < kParts; ++i)
-        own[i] = V::load(description + i * V::kBytes);
+        own[i] = load<Bytes>(description + i * kVector);
     int n = 0;
     for (int j = 0; j < count; j += 4, others += 4 * kDescription) {
-        V::Ints sum[4];
-        for (int k = 0; k < 4; ++k) {
-            const uint8_t* const other = others + k * kDescription;
-            sum[k] = V::differences(own[0], V::load(other));
-            for (int i = 1; i < kParts; ++i)
-                sum[k] = V::plus(sum[k], V::differences(own[i], V::load(other + i * V::kBytes)));
-        }
-        const __m128i four = V::totals(sum[0], sum[1], sum[2], sum[3]);
-        storeFour(sums + j, four);
-        for (int below = belowEither(four, limits + j, limit); below; below &= below - 1)
+        Sums sum[4] = {};
+        for (int k = 0; k < 4; ++k)
+            for (int i = 0; i < kParts; ++i)
+                sum[k] = plusDifferences(sum[k], own[i], load<Bytes>(others + k * kDescription + i * kVector));
+        const FourInts four = totals(sum[0], sum[1], sum[2], sum[3]);
+        store(sums + j, four);
+        for (int below = bitsOf(four < most(load<FourInts>(limits + j), FourInts{} + limit)); below; below &= below - 1)
             found[n++] = j + __builtin_ctz(static_cast<unsigned>(below));
     }
     return n;
 }
 
 int correlate(const int16_t* patch, const uint8_t* window, ptrdiff_t step) {
-    using V = Lanes;
-    V::Ints sum = V::noInts();
+    Products sums = {};
     for (int y = 0; y < kPatch; ++y)
-        sum = V::plus(sum, V::products(patch + y * kPatch, window + y * step));
-    return V::sum(sum);
+        sums = plusProducts(sums, patch + y * kPatch, window + y * step);
+    return total(sums);
 }
 
 } // namespace

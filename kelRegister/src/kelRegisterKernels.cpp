@@ -4,7 +4,11 @@
 namespace kelRegister {
 
 const Kernels& kernels() {
+#ifdef __aarch64__
+    return kKernelsNeon;
+#else
     return __builtin_cpu_supports("avx2") ? kKernelsAvx2 : kKernelsSse;
+#endif
 }
 
 } // namespace kelRegister

@@ -27,7 +27,7 @@ struct Kernels {
     int (*correlate)(const int16_t* patch, const uint8_t* window, ptrdiff_t step);
 };
 
-extern const Kernels kKernelsSse, kKernelsAvx2;
+extern const Kernels kKernelsSse, kKernelsAvx2, kKernelsNeon;
 
 // Those that suit this processor.
 const Kernels& kernels();

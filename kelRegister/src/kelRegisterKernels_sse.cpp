@@ -1,4 +1,4 @@
-// The kernels for every processor: SSE4.1.
+// The kernels for every x86 processor: SSE4.1.
 #include "kelRegisterKernelBodies.h"
 
 namespace kelRegister {

@@ -1,4 +1,5 @@
-// The vocabulary of vectors: lanes of 128 bits that repeat. Another instruction set is another struct of these names.
+// The vocabulary of vectors: those of the compiler, whose operators mean the same on every processor, and a name for what each
+// instruction set does in its own way. Sums of integers may be taken in any order; those of floats are taken as written.
 // Everything has internal linkage, and the standard library stays outside: files that include this are compiled for different
 // processors, and nothing of theirs may serve the others.
 #ifndef KEL_REGISTER_LANES_H
@@ -8,162 +9,201 @@
 #include <stdint.h>
 #include <string.h>
 
+#ifdef __aarch64__
+#include <arm_neon.h>
+#else
 #include <immintrin.h>
+#endif
 
 namespace {
 
-#if defined(__AVX2__)
+#ifdef __AVX2__
+constexpr int kVector = 32; // bytes
+#else
+constexpr int kVector = 16;
+#endif
+constexpr int kFloats = kVector / 4;
 
-struct Lanes {
-    using Bytes = __m256i;
-    using Ints = __m256i;
-    using Floats = __m256;
-    static constexpr int kBytes = 32, kFloats = 8;
+using Bytes = uint8_t __attribute__((vector_size(kVector)));
+using Ints = int32_t __attribute__((vector_size(kVector)));
+using Unsigned = uint32_t __attribute__((vector_size(kVector))); // whose sums the compiler may take in any order
+using Floats = float __attribute__((vector_size(kVector)));
+using FourInts = int32_t __attribute__((vector_size(16)));
 
-    static Bytes load(const uint8_t* p) { return _mm256_loadu_si256(reinterpret_cast<const __m256i*>(p)); }
-    static Ints noInts() { return _mm256_setzero_si256(); }
-    static Ints plus(Ints a, Ints b) { return _mm256_add_epi32(a, b); }
-    static Ints minus(Ints a, Ints b) { return _mm256_sub_epi32(a, b); }
-    static Ints allInts(int v) { return _mm256_set1_epi32(v); }
-    static Ints least(Ints a, Ints b) { return _mm256_min_epi32(a, b); }
-    static Ints both(Ints a, Ints b) { return _mm256_and_si256(a, b); }
-    static Ints either(Ints a, Ints b) { return _mm256_or_si256(a, b); }
-    static Ints shiftedUp8(Ints a) { return _mm256_slli_epi32(a, 8); }
-    // Bytes widened to ints.
-    static Ints loadWide(const uint8_t* p) {
-        return _mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(p)));
-    }
-    // The low halves, which are all that is set.
-    static void storeLowHalves(uint16_t* p, Ints v) {
-        const __m128i packed = _mm_packus_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1));
-        _mm_storeu_si128(reinterpret_cast<__m128i*>(p), packed);
-    }
-    static Floats toFloats(Ints v) { return _mm256_cvtepi32_ps(v); }
-    static Ints truncated(Floats v) { return _mm256_cvttps_epi32(v); }
-    static Floats all(float v) { return _mm256_set1_ps(v); }
-    static Floats plus(Floats a, Floats b) { return _mm256_add_ps(a, b); }
-    static Floats minus(Floats a, Floats b) { return _mm256_sub_ps(a, b); }
-    static Floats times(Floats a, Floats b) { return _mm256_mul_ps(a, b); }
-    static Floats over(Floats a, Floats b) { return _mm256_div_ps(a, b); }
-    static Floats least(Floats a, Floats b) { return _mm256_min_ps(a, b); }
-    static Floats most(Floats a, Floats b) { return _mm256_max_ps(a, b); }
-    static Floats root(Floats a) { return _mm256_sqrt_ps(a); }
-    static Floats magnitude(Floats a) { return _mm256_andnot_ps(_mm256_set1_ps(-0.0f), a); }
-    static Floats whereLess(Floats a, Floats b, Floats yes, Floats no) {
-        return _mm256_blendv_ps(no, yes, _mm256_cmp_ps(a, b, _CMP_LT_OQ));
-    }
-    // Sums of absolute differences, one for every eight bytes.
-    static Ints differences(Bytes a, Bytes b) { return _mm256_sad_epu8(a, b); }
-    // Four such vectors of sums to one sum each.
-    static __m128i totals(Ints a, Ints b, Ints c, Ints d) {
-        const __m256i ab = _mm256_add_epi32(a, _mm256_slli_epi64(b, 32)), cd = _mm256_add_epi32(c, _mm256_slli_epi64(d, 32));
-        const __m256i sums = _mm256_add_epi32(_mm256_unpacklo_epi64(ab, cd), _mm256_unpackhi_epi64(ab, cd));
-        return _mm_add_epi32(_mm256_castsi256_si128(sums), _mm256_extracti128_si256(sums, 1));
-    }
-    // Products of sixteen 16-bit values with sixteen bytes, added up in any way.
-    static Ints products(const int16_t* values, const uint8_t* bytes) {
-        const __m256i wide = _mm256_cvtepu8_epi16(_mm_loadu_si128(reinterpret_cast<const __m128i*>(bytes)));
-        return _mm256_madd_epi16(wide, _mm256_loadu_si256(reinterpret_cast<const __m256i*>(values)));
-    }
-    static int sum(Ints v) {
-        __m128i s = _mm_add_epi32(_mm256_castsi256_si128(v), _mm256_extracti128_si256(v, 1));
-        s = _mm_add_epi32(s, _mm_unpackhi_epi64(s, s));
-        return _mm_cvtsi128_si32(s) + _mm_extract_epi32(s, 1);
-    }
-};
-
-struct Eight { // floats
-    __m256 v;
-    static Eight load(const float* p) { return {_mm256_loadu_ps(p)}; }
-    static Eight none() { return {_mm256_setzero_ps()}; }
-    void store(float* p) const { _mm256_storeu_ps(p, v); }
-};
-inline Eight operator+(Eight a, Eight b) {
-    return {_mm256_add_ps(a.v, b.v)};
+template <class V> struct __attribute__((packed, may_alias)) InMemory { V vector; };
+template <class V> inline V load(const void* p) {
+    return static_cast<const InMemory<V>*>(p)->vector;
 }
-inline Eight operator*(Eight a, float b) {
-    return {_mm256_mul_ps(a.v, _mm256_set1_ps(b))};
+template <class V> inline void store(void* p, V v) {
+    static_cast<InMemory<V>*>(p)->vector = v;
+}
+
+template <class V> inline V least(V a, V b) {
+    return a < b ? a : b;
+}
+template <class V> inline V most(V a, V b) {
+    return a > b ? a : b;
+}
+inline Floats magnitude(Floats a) {
+    return (Floats)((Ints)a & INT32_MAX);
+}
+inline Floats toFloats(Ints v) {
+    return __builtin_convertvector(v, Floats);
+}
+// Of values that an int holds: of others processors make different ints.
+inline Ints truncated(Floats v) {
+    return __builtin_convertvector(v, Ints);
+}
+
+// For each instruction set:
+//   loadWide(p)                      bytes widened to ints
+//   storeLowHalves(p, v)             the low halves of ints, which are all that is set
+//   root(v)                          square roots
+//   Sums, plusDifferences(s, a, b)   sums of absolute differences, kept apart in some way; of no more than 256 bytes
+//   totals(a, b, c, d)               four such to one sum each
+//   Products, plusProducts(p, values, bytes)
+//                                    sums of products of sixteen 16-bit values with sixteen bytes, kept apart in some way
+//   total(p)                         those to one sum
+//   bitsOf(mask)                     bit i: whether the comparison held for value i
+//   Eight                            floats
+
+#if defined(__aarch64__)
+
+inline Ints loadWide(const uint8_t* p) {
+    uint32_t four;
+    memcpy(&four, p, 4);
+    return (Ints)vmovl_u16(vget_low_u16(vmovl_u8(vcreate_u8(four))));
+}
+inline void storeLowHalves(uint16_t* p, Ints v) {
+    vst1_u16(p, vmovn_u32((uint32x4_t)v));
+}
+inline Floats root(Floats v) {
+    return vsqrtq_f32(v);
+}
+using Sums = uint16x8_t;
+inline Sums plusDifferences(Sums sums, Bytes a, Bytes b) {
+    return vpadalq_u8(sums, vabdq_u8(a, b));
+}
+inline FourInts totals(Sums a, Sums b, Sums c, Sums d) {
+    return (FourInts)vpaddlq_u16(vpaddq_u16(vpaddq_u16(a, b), vpaddq_u16(c, d)));
+}
+using Products = int32x4_t;
+inline Products plusProducts(Products sums, const int16_t* values, const uint8_t* bytes) {
+    const uint8x16_t v = vld1q_u8(bytes);
+    const int16x8_t low = (int16x8_t)vmovl_u8(vget_low_u8(v)), high = (int16x8_t)vmovl_high_u8(v);
+    const int16x8_t first = vld1q_s16(values), second = vld1q_s16(values + 8);
+    const int32x4_t some = vmlal_high_s16(vmlal_s16(sums, vget_low_s16(first), vget_low_s16(low)), first, low);
+    return vmlal_high_s16(vmlal_s16(some, vget_low_s16(second), vget_low_s16(high)), second, high);
+}
+inline int total(Products sums) {
+    return vaddvq_s32(sums);
+}
+inline int bitsOf(FourInts mask) {
+    const FourInts bits = {1, 2, 4, 8};
+    return vaddvq_s32(mask & bits);
+}
+
+#elif defined(__AVX2__)
+
+using Sums = Unsigned;
+using Products = Unsigned;
+inline Ints loadWide(const uint8_t* p) {
+    return (Ints)_mm256_cvtepu8_epi32(_mm_loadl_epi64(reinterpret_cast<const __m128i*>(p)));
+}
+inline void storeLowHalves(uint16_t* p, Ints v) {
+    const __m256i all = (__m256i)v;
+    store(p, _mm_packus_epi32(_mm256_castsi256_si128(all), _mm256_extracti128_si256(all, 1)));
+}
+inline Floats root(Floats v) {
+    return _mm256_sqrt_ps(v);
+}
+inline Sums plusDifferences(Sums sums, Bytes a, Bytes b) {
+    return sums + (Sums)_mm256_sad_epu8((__m256i)a, (__m256i)b);
+}
+inline FourInts totals(Sums a, Sums b, Sums c, Sums d) {
+    const __m256i ab = (__m256i)(a + (Sums)_mm256_slli_epi64((__m256i)b, 32));
+    const __m256i cd = (__m256i)(c + (Sums)_mm256_slli_epi64((__m256i)d, 32));
+    const __m256i sums = _mm256_add_epi32(_mm256_unpacklo_epi64(ab, cd), _mm256_unpackhi_epi64(ab, cd));
+    return (FourInts)_mm_add_epi32(_mm256_castsi256_si128(sums), _mm256_extracti128_si256(sums, 1));
+}
+inline Products plusProducts(Products sums, const int16_t* values, const uint8_t* bytes) {
+    return sums + (Products)_mm256_madd_epi16(_mm256_cvtepu8_epi16(load<__m128i>(bytes)), load<__m256i>(values));
 }
 
 #else
 
-struct Lanes {
-    using Bytes = __m128i;
-    using Ints = __m128i;
-    using Floats = __m128;
-    static constexpr int kBytes = 16, kFloats = 4;
-
-    static Bytes load(const uint8_t* p) { return _mm_loadu_si128(reinterpret_cast<const __m128i*>(p)); }
-    static Ints noInts() { return _mm_setzero_si128(); }
-    static Ints plus(Ints a, Ints b) { return _mm_add_epi32(a, b); }
-    static Ints minus(Ints a, Ints b) { return _mm_sub_epi32(a, b); }
-    static Ints allInts(int v) { return _mm_set1_epi32(v); }
-    static Ints least(Ints a, Ints b) { return _mm_min_epi32(a, b); }
-    static Ints both(Ints a, Ints b) { return _mm_and_si128(a, b); }
-    static Ints either(Ints a, Ints b) { return _mm_or_si128(a, b); }
-    static Ints shiftedUp8(Ints a) { return _mm_slli_epi32(a, 8); }
-    static Ints loadWide(const uint8_t* p) {
-        int four;
-        memcpy(&four, p, 4);
-        return _mm_cvtepu8_epi32(_mm_cvtsi32_si128(four));
-    }
-    static void storeLowHalves(uint16_t* p, Ints v) { _mm_storel_epi64(reinterpret_cast<__m128i*>(p), _mm_packus_epi32(v, v)); }
-    static Floats toFloats(Ints v) { return _mm_cvtepi32_ps(v); }
-    static Ints truncated(Floats v) { return _mm_cvttps_epi32(v); }
-    static Floats all(float v) { return _mm_set1_ps(v); }
-    static Floats plus(Floats a, Floats b) { return _mm_add_ps(a, b); }
-    static Floats minus(Floats a, Floats b) { return _mm_sub_ps(a, b); }
-    static Floats times(Floats a, Floats b) { return _mm_mul_ps(a, b); }
-    static Floats over(Floats a, Floats b) { return _mm_div_ps(a, b); }
-    static Floats least(Floats a, Floats b) { return _mm_min_ps(a, b); }
-    static Floats most(Floats a, Floats b) { return _mm_max_ps(a, b); }
-    static Floats root(Floats a) { return _mm_sqrt_ps(a); }
-    static Floats magnitude(Floats a) { return _mm_andnot_ps(_mm_set1_ps(-0.0f), a); }
-    static Floats whereLess(Floats a, Floats b, Floats yes, Floats no) { return _mm_blendv_ps(no, yes, _mm_cmplt_ps(a, b)); }
-    static Ints differences(Bytes a, Bytes b) { return _mm_sad_epu8(a, b); }
-    static __m128i totals(Ints a, Ints b, Ints c, Ints d) {
-        const __m128i ab = _mm_add_epi32(a, _mm_slli_epi64(b, 32)), cd = _mm_add_epi32(c, _mm_slli_epi64(d, 32));
-        return _mm_add_epi32(_mm_unpacklo_epi64(ab, cd), _mm_unpackhi_epi64(ab, cd));
-    }
-    static Ints products(const int16_t* values, const uint8_t* bytes) {
-        const __m128i v = _mm_loadu_si128(reinterpret_cast<const __m128i*>(bytes)), zero = _mm_setzero_si128();
-        const __m128i* const factors = reinterpret_cast<const __m128i*>(values);
-        return _mm_add_epi32(_mm_madd_epi16(_mm_unpacklo_epi8(v, zero), _mm_loadu_si128(factors)),
-                             _mm_madd_epi16(_mm_unpackhi_epi8(v, zero), _mm_loadu_si128(factors + 1)));
-    }
-    static int sum(Ints v) {
-        const __m128i s = _mm_add_epi32(v, _mm_unpackhi_epi64(v, v));
-        return _mm_cvtsi128_si32(s) + _mm_extract_epi32(s, 1);
-    }
-};
-
-struct Eight { // floats
-    __m128 low, high;
-    static Eight load(const float* p) { return {_mm_loadu_ps(p), _mm_loadu_ps(p + 4)}; }
-    static Eight none() { return {_mm_setzero_ps(), _mm_setzero_ps()}; }
-    void store(float* p) const {
-        _mm_storeu_ps(p, low);
-        _mm_storeu_ps(p + 4, high);
-    }
-};
-inline Eight operator+(Eight a, Eight b) {
-    return {_mm_add_ps(a.low, b.low), _mm_add_ps(a.high, b.high)};
+using Sums = Unsigned;
+using Products = Unsigned;
+inline Ints loadWide(const uint8_t* p) {
+    int four;
+    memcpy(&four, p, 4);
+    return (Ints)_mm_cvtepu8_epi32(_mm_cvtsi32_si128(four));
 }
-inline Eight operator*(Eight a, float b) {
-    const __m128 all = _mm_set1_ps(b);
-    return {_mm_mul_ps(a.low, all), _mm_mul_ps(a.high, all)};
+inline void storeLowHalves(uint16_t* p, Ints v) {
+    _mm_storel_epi64(reinterpret_cast<__m128i*>(p), _mm_packus_epi32((__m128i)v, (__m128i)v));
+}
+inline Floats root(Floats v) {
+    return _mm_sqrt_ps(v);
+}
+inline Sums plusDifferences(Sums sums, Bytes a, Bytes b) {
+    return sums + (Sums)_mm_sad_epu8((__m128i)a, (__m128i)b);
+}
+inline FourInts totals(Sums a, Sums b, Sums c, Sums d) {
+    const __m128i ab = (__m128i)(a + (Sums)_mm_slli_epi64((__m128i)b, 32));
+    const __m128i cd = (__m128i)(c + (Sums)_mm_slli_epi64((__m128i)d, 32));
+    return (FourInts)_mm_add_epi32(_mm_unpacklo_epi64(ab, cd), _mm_unpackhi_epi64(ab, cd));
+}
+inline Products plusProducts(Products sums, const int16_t* values, const uint8_t* bytes) {
+    const __m128i v = load<__m128i>(bytes), zero = _mm_setzero_si128();
+    return sums + ((Products)_mm_madd_epi16(_mm_unpacklo_epi8(v, zero), load<__m128i>(values)) +
+                   (Products)_mm_madd_epi16(_mm_unpackhi_epi8(v, zero), load<__m128i>(values + 8)));
 }
 
 #endif
 
-// Bit i: whether value i of the first is below either of the others.
-inline int belowEither(__m128i values, const int* limits, int limit) {
-    const __m128i other = _mm_loadu_si128(reinterpret_cast<const __m128i*>(limits));
-    return _mm_movemask_ps(_mm_castsi128_ps(_mm_cmplt_epi32(values, _mm_max_epi32(other, _mm_set1_epi32(limit)))));
+#ifndef __aarch64__ // what x86 does alike in every width
+inline int total(Products sums) {
+#ifdef __AVX2__
+    const FourInts four =
+        (FourInts)_mm256_castsi256_si128((__m256i)sums) + (FourInts)_mm256_extracti128_si256((__m256i)sums, 1);
+#else
+    const FourInts four = (FourInts)sums;
+#endif
+    return (four[0] + four[2]) + (four[1] + four[3]);
 }
-inline void storeFour(int* p, __m128i values) {
-    _mm_storeu_si128(reinterpret_cast<__m128i*>(p), values);
+inline int bitsOf(FourInts mask) {
+    return _mm_movemask_ps((__m128)mask);
 }
+#endif
+
+#ifdef __AVX2__
+struct Eight {
+    Floats v;
+    static Eight load(const float* p) { return {::load<Floats>(p)}; }
+    void store(float* p) const { ::store(p, v); }
+};
+inline Eight operator+(Eight a, Eight b) {
+    return {a.v + b.v};
+}
+inline Eight operator*(Eight a, float b) {
+    return {a.v * b};
+}
+#else
+struct Eight {
+    Floats low, high;
+    static Eight load(const float* p) { return {::load<Floats>(p), ::load<Floats>(p + 4)}; }
+    void store(float* p) const {
+        ::store(p, low);
+        ::store(p + 4, high);
+    }
+};
+inline Eight operator+(Eight a, Eight b) {
+    return {a.low + b.low, a.high + b.high};
+}
+inline Eight operator*(Eight a, float b) {
+    return {a.low * b, a.high * b};
+}
+#endif
 
 } // namespace
 

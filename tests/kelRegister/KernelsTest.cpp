@@ -12,12 +12,25 @@ using namespace kelRegister;
 
 namespace {
 
-class RegisterKernels : public ::testing::TestWithParam<const Kernels*> {
+struct Set { // of instructions
+    const char* name;
+    const Kernels* kernels;
+    bool (*isHere)();
+};
+#ifdef __aarch64__
+const Set kSets[] = {{"Neon", &kKernelsNeon, [] { return true; }}};
+#else
+const Set kSets[] = {{"Sse", &kKernelsSse, [] { return true; }},
+                     {"Avx2", &kKernelsAvx2, [] { return __builtin_cpu_supports("avx2") != 0; }}};
+#endif
+
+class RegisterKernels : public ::testing::TestWithParam<Set> {
 protected:
     void SetUp() override {
-        if (GetParam() == &kKernelsAvx2 && !__builtin_cpu_supports("avx2"))
-            GTEST_SKIP() << "this processor has no AVX2";
+        if (!GetParam().isHere())
+            GTEST_SKIP() << "this processor has no " << GetParam().name;
     }
+    const Kernels& kernels() const { return *GetParam().kernels; }
     int number(int end) { return static_cast<int>(m_numbers() % static_cast<unsigned>(end)); }
     std::vector<uint8_t> bytes(size_t count, int end = 256) {
         std::vector<uint8_t> all(count);
@@ -34,7 +47,7 @@ TEST_P(RegisterKernels, GradientsHaveStrengthAndDirection) {
         for (const int end : {256, 2, 12}) {
             const std::vector<uint8_t> image = bytes(4 * kStep, end);
             std::vector<uint16_t> out(kStep, 0xeeee);
-            GetParam()->gradients(out.data(), image.data() + kStep + 8, kStep, width);
+            kernels().gradients(out.data(), image.data() + kStep + 8, kStep, width);
             for (int x = 0; x < width; ++x) {
                 const uint8_t* const p = image.data() + kStep + 8 + x;
                 const double gx = p[1] - p[-1], gy = p[kStep] - p[-kStep];
@@ -64,7 +77,7 @@ TEST_P(RegisterKernels, DifferencesAndWhichAreBelowALimit) {
         }
         std::vector<int> actual(sums.size(), 0);
         const int n =
-            GetParam()->differences(found.data(), actual.data(), own.data(), others.data(), limits.data(), limit, count);
+            kernels().differences(found.data(), actual.data(), own.data(), others.data(), limits.data(), limit, count);
         found.resize(static_cast<size_t>(n));
         EXPECT_EQ(found, expected);
         EXPECT_EQ(actual, sums);
@@ -83,7 +96,7 @@ TEST_P(RegisterKernels, CorrelationSumsProducts) {
             for (int y = 0; y < kPatch; ++y)
                 for (int x = 0; x < kPatch; ++x)
                     sum += patch[y * kPatch + x] * window[y * kStep + left + x];
-            ASSERT_EQ(GetParam()->correlate(patch.data(), window.data() + left, kStep), sum);
+            ASSERT_EQ(kernels().correlate(patch.data(), window.data() + left, kStep), sum);
         }
     }
 }
@@ -99,7 +112,7 @@ TEST_P(RegisterKernels, DescriptionsShareSamplesBetweenCells) {
         for (float& share : row)
             share = static_cast<float>(number(100)) / 100;
     std::vector<float> cells(kDescription);
-    GetParam()->describe(cells.data(), strengths.data(), grid.data(), directions);
+    kernels().describe(cells.data(), strengths.data(), grid.data(), directions);
     for (int cy = 0; cy < kCells; ++cy)
         for (int cx = 0; cx < kCells; ++cx)
             for (int d = 0; d < kDirections; ++d) {
@@ -111,12 +124,11 @@ TEST_P(RegisterKernels, DescriptionsShareSamplesBetweenCells) {
                 }
                 ASSERT_NEAR(cells[(cy * kCells + cx) * kDirections + d], sum, 1e-4 * sum);
             }
-    std::vector<float> plain(kDescription); // and the same bits whatever the processor
-    kKernelsSse.describe(plain.data(), strengths.data(), grid.data(), directions);
+    std::vector<float> plain(kDescription); // and the same bits from every set
+    kSets[0].kernels->describe(plain.data(), strengths.data(), grid.data(), directions);
     EXPECT_EQ(cells, plain);
 }
 
-INSTANTIATE_TEST_SUITE_P(Sets, RegisterKernels, ::testing::Values(&kKernelsSse, &kKernelsAvx2),
-                         [](const auto& info) { return info.param == &kKernelsSse ? "Sse" : "Avx2"; });
+INSTANTIATE_TEST_SUITE_P(Sets, RegisterKernels, ::testing::ValuesIn(kSets), [](const auto& info) { return info.param.name; });
 
 } // namespace
