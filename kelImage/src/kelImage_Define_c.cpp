@@ -3,6 +3,7 @@
 #include <cstdlib>
 
 #include "kelAssert.h"
+#include "kelDivision.h"
 #include "kelImage.h"
 
 extern "C" {
@@ -15,7 +16,7 @@ int KEL_RAND(int x) {
 int KEL_RAND_NORMAL(int x) {
     int64_t sum = 0; // twelve draws of a large x do not fit into an int
     for (int draw = 0; draw < 12; ++draw)
-        sum += rand() % (int64_t(x) + 1);
+        sum += rand() % kel::divisor(int64_t(x) + 1);
     return static_cast<int>(sum - 6 * int64_t(x));
 }
 

@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "kelDivision.h"
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"
 #include "kelImage_Resize.h"
@@ -18,8 +19,8 @@ struct Steps {
     Buffer<uint16_t> weight;
 
     Steps(kelValue_s32 outputs, kelValue_s32 inputs) : index(allocate<int32_t>(outputs)), weight(allocate<uint16_t>(outputs)) {
-        const kelValue_s32 divisor = kel::gcd(outputs, inputs);
-        const int64_t a = outputs / divisor, b = inputs / divisor;
+        const kelValue_s32 common = kel::divisor(kel::gcd(outputs, inputs));
+        const int64_t a = outputs / common, b = inputs / common;
         kelValue_s32 k = 0;
         for (kelValue_s32 i = 0; i < outputs; ++i) {
             k += (k + 1) * a <= i * b;

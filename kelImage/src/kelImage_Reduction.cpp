@@ -2,6 +2,7 @@
 // first, then columns of such rows. Rests on kernels for the usual boxes and on plain sums for those beyond.
 #include <algorithm>
 
+#include "kelDivision.h"
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"
 #include "kelImage_Resize.h"
@@ -28,10 +29,10 @@ struct Ratio {
 
     // A box of one is taken as two of the same input twice: its reciprocal would be too large for the kernels.
     Ratio(kelValue_s32 outputs, kelValue_s32 inputs) : repeat(outputs), box(inputs) {
-        const kelValue_s32 divisor = kel::gcd(outputs, inputs);
-        const int twice = inputs == divisor ? 2 : 1;
-        repeat = repeat / divisor * twice;
-        box = box / divisor * twice;
+        const kelValue_s32 common = kel::divisor(kel::gcd(outputs, inputs));
+        const int twice = inputs == common ? 2 : 1;
+        repeat = repeat / common * twice;
+        box = box / common * twice;
     }
     bool isHalf() const { return repeat == 1 && box == 2; }
     Box at(kelValue_s32 output) const {
@@ -98,7 +99,7 @@ private:
             int64_t sum = 0;
             for (kelValue_s32 k = box.first; k <= box.last; ++k)
                 sum += m_ratio.weight(box, k) * (from[k] >> shift & 0xff);
-            result |= static_cast<uint32_t>(sum / m_ratio.box) << shift;
+            result |= static_cast<uint32_t>(sum / kel::divisor(m_ratio.box)) << shift;
         }
         return result;
     }
@@ -131,7 +132,8 @@ public:
             m_weights[k] = static_cast<uint16_t>(m_ratio.weight(box, box.first + k));
         }
         if (m_reduce)
-            return m_reduce(to, m_row.get(), m_weights.get(), m_rows / 2, bytes, static_cast<uint32_t>(m_ratio.box));
+            return m_reduce(to, m_row.get(), m_weights.get(), m_rows / 2, bytes,
+                            static_cast<uint32_t>(kel::divisor(m_ratio.box)));
         for (ptrdiff_t i = 0; i < bytes; ++i) {
             int64_t sum = 0;
             for (kelValue_s32 k = box.first; k <= box.last; ++k)

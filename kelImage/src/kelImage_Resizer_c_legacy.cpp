@@ -2,6 +2,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "kelDivision.h"
 #include "kelImage_Private.h"
 #include "kelImage_Resize.h"
 
@@ -73,7 +74,7 @@ void resizeKelImageNearest(kelImage_t* dst, const kelImage_t* src) {
 }
 
 void resizeKelImageBilinear(kelImage_t* dst, const kelImage_t* src) {
-    const kelValue_s32 rx = src->width / dst->width, ry = src->height / dst->height;
+    const kelValue_s32 rx = src->width / kel::divisor(dst->width), ry = src->height / kel::divisor(dst->height);
     __asm__ volatile("" ::"r"(rx), "r"(ry)); // an empty destination divides by zero here, before any check
     KEL_ASSERT(dst->type == src->type);
     if (dst->type != KEL_PIXEL_TYPE_U8G || dst->width < 0)

@@ -2,6 +2,7 @@
 // ratio 0 and samples pixel (0, 0) throughout. Rests on the kernels that take every second pixel or average four.
 #include <cstring>
 
+#include "kelDivision.h"
 #include "kelImage_Kernels.h"
 #include "kelImage_Private.h"
 #include "kelImage_Resize.h"
@@ -37,7 +38,7 @@ template <class P> void decimateRow(const Kernels& kernels, P* dst, const P* src
 }
 
 template <class P> void nearest(kelImage_t* dst, const kelImage_t* src) {
-    const kelValue_s32 rx = src->width / dst->width, ry = src->height / dst->height;
+    const kelValue_s32 rx = src->width / kel::divisor(dst->width), ry = src->height / kel::divisor(dst->height);
     __asm__ volatile("" ::"r"(rx), "r"(ry)); // an empty destination divides by zero here, whether the ratio is needed or not
     if (dst->width < 0)
         return;

@@ -90,4 +90,5 @@ TEST(Random, DrawsFromRandInOrder) {
 TEST(Random, RefusesAnEmptyRange) {
     for (int x : {0, -3})
         EXPECT_STOPS(KEL_RAND(x), "0<x", "kelImage/src/kelImage_Define_c.cpp", "int KEL_RAND(int)");
+    EXPECT_DIVISION_BY_ZERO(KEL_RAND_NORMAL(-1));
 }

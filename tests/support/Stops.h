@@ -1,4 +1,4 @@
-// Checks that a call stops the process with an assertion report that names text, source file and signature.
+// Checks that a call stops the process, with an assertion report that names text, source file and signature or by a division.
 #ifndef KEL_TESTS_STOPS_H
 #define KEL_TESTS_STOPS_H
 
@@ -24,5 +24,12 @@ inline testing::Matcher<const std::string&> report(const std::string& text, cons
     if (RUNNING_ON_VALGRIND) {                                                                                                 \
     } else                                                                                                                     \
         EXPECT_EXIT(statement, testing::KilledBySignal(SIGABRT), kel_test::report(text, file, signature))
+
+// That a call divides an integer by zero, which ends the process on every processor; a sanitizer finds it first and names it.
+#ifdef __SANITIZE_ADDRESS__
+#define EXPECT_DIVISION_BY_ZERO(statement) EXPECT_DEATH(statement, "division by zero")
+#else
+#define EXPECT_DIVISION_BY_ZERO(statement) EXPECT_EXIT(statement, testing::KilledBySignal(SIGFPE), "")
+#endif
 
 #endif
