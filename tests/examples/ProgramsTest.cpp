@@ -46,8 +46,9 @@ protected:
     std::string path(const std::string& name) const { return (m_folder / name).string(); }
 
     Outcome run(const std::string& program, const std::string& arguments) const {
-        write("command", "cd '" + m_folder.string() + "'; exec > stdout.txt 2> stderr.txt; '" KEL_EXAMPLES_DIR "/" + program +
-                             "' " + arguments + "\n");
+        write("command", "cd '" + m_folder.string() +
+                             "'; exec > stdout.txt 2> stderr.txt; $KEL_EMULATOR '" KEL_EXAMPLES_DIR "/" + program + "' " +
+                             arguments + "\n");
         const int status = std::system(("bash '" + path("command") + "'").c_str());
         return {WIFEXITED(status) ? WEXITSTATUS(status) : -1, contents(path("stdout.txt")), contents(path("stderr.txt"))};
     }
@@ -515,7 +516,7 @@ TEST_F(Programs, LeaveNothingBehindWhenInterrupted) {
     write("out", "old");
     for (const char* signal : {"INT", "TERM", "HUP"}) {
         const std::string command = "cd '" + m_folder.string() + "' && (cat in.uyvy; sleep 1) | (timeout -s " + signal +
-                                    " 0.5 '" KEL_EXAMPLES_DIR "/stabilize' --size 320x240 --output out; true)";
+                                    " 0.5 $KEL_EMULATOR '" KEL_EXAMPLES_DIR "/stabilize' --size 320x240 --output out; true)";
         EXPECT_EQ(std::system(command.c_str()), 0);
         EXPECT_EQ(contents(path("out")), "old");
         EXPECT_EQ(std::distance(fs::directory_iterator(m_folder), fs::directory_iterator()), 2) << signal;
