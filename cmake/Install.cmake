@@ -44,6 +44,8 @@ install(FILES ${PROJECT_BINARY_DIR}/kelregister.pc DESTINATION ${kel_pc_dir} COM
 # The programs, under names that leave "register" and the like to others, with man pages from what they say of themselves.
 if(KEL_BUILD_EXAMPLES)
   find_program(KEL_HELP2MAN help2man)
+  list(JOIN CMAKE_CROSSCOMPILING_EMULATOR " " kel_emulator)
+  string(REGEX REPLACE "(.)$" "\\1 " kel_emulator "${kel_emulator}")
   foreach(program IN LISTS kel_programs)
     install(TARGETS ${program} RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT tools)
     install(CODE "set(bin \"\$ENV{DESTDIR}\${CMAKE_INSTALL_PREFIX}/${CMAKE_INSTALL_BINDIR}\")
@@ -51,14 +53,14 @@ if(KEL_BUILD_EXAMPLES)
     if(KEL_HELP2MAN)
       set(page ${PROJECT_BINARY_DIR}/man/kel-${program}.1)
       add_custom_command(OUTPUT ${page} DEPENDS ${program}
-        COMMAND ${CMAKE_COMMAND} -E create_symlink $<TARGET_FILE:${program}> ${PROJECT_BINARY_DIR}/man/kel-${program}
+        COMMAND ${CMAKE_COMMAND} -E create_symlink $<TARGET_FILE:${program}> ${PROJECT_BINARY_DIR}/man/bin/kel-${program}
         COMMAND ${KEL_HELP2MAN} --no-info --section 1 "--name=${kel_${program}_does}" --output ${page}
-          ${PROJECT_BINARY_DIR}/man/kel-${program} VERBATIM)
+          "${kel_emulator}${PROJECT_BINARY_DIR}/man/bin/kel-${program}" VERBATIM)
       list(APPEND kel_pages ${page})
     endif()
   endforeach()
   if(KEL_HELP2MAN)
-    file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/man)
+    file(MAKE_DIRECTORY ${PROJECT_BINARY_DIR}/man/bin)
     add_custom_target(kel_man ALL DEPENDS ${kel_pages})
     install(FILES ${kel_pages} DESTINATION ${CMAKE_INSTALL_MANDIR}/man1 COMPONENT tools)
   endif()
