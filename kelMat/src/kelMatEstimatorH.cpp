@@ -1,6 +1,7 @@
 // Homographies from pairs of 2-D points: four-point solution, least squares, Taubin's method, RANSAC.
 #include <cstdlib>
 
+#include "kelDivision.h"
 #include "kelMatEstimator_Private.h"
 
 namespace {
@@ -133,7 +134,7 @@ bool kelMatEstimatorH::estimate_byRANSAC_fine(kelMatCorrespH& corresp, float thr
 }
 
 void getRandomIndex(int& a, int& b, int& c, int& d, int n) {
-    a = rand() % n;
+    a = rand() % kel::divisor(n);
     do
         b = rand() % n;
     while (b == a);

@@ -2,6 +2,7 @@
 #include <cstdio>
 #include <cstdlib>
 
+#include "kelDivision.h"
 #include "kelMatEstimator_Private.h"
 
 namespace {
@@ -129,7 +130,7 @@ void getRandomIndex(int n, int& a, int& b, int& c, int& d, int& e, int& f) {
             return std::any_of(drawn, drawn + i, [&](const int* earlier) { return *earlier == *drawn[i]; });
         };
         do
-            *drawn[i] = rand() % n;
+            *drawn[i] = rand() % kel::divisor(n);
         while (repeated());
     }
 }

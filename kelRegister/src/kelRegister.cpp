@@ -109,7 +109,7 @@ private:
         r.tested = r.agreeing = 0;
         r.share = r.expectedError = 0;
         r.matches = matchFeatures(r.first, r.second);
-        const double diagonal = std::hypot(m_first.width, m_first.height);
+        const double diagonal = distance({0, 0}, {double(m_first.width), double(m_first.height)});
         const std::vector<bool> marks =
             supported(r.first, r.second, r.matches, kSupportReach * diagonal, kSupportSlack * m_second.workingScale);
         std::vector<Pair> all, some;

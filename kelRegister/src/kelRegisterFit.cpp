@@ -39,7 +39,7 @@ Units unitsOf(const std::vector<Pair>& pairs, Point Pair::*which) {
     }
     const double x = quantile(xs, 0.5), y = quantile(ys, 0.5);
     for (const Pair& p : pairs)
-        distances.push_back(std::hypot((p.*which).x - x, (p.*which).y - y));
+        distances.push_back(distance(p.*which, {x, y}));
     return {x, y, kExtent / std::max(1e-3, quantile(distances, kMost))};
 }
 
@@ -114,9 +114,7 @@ std::vector<bool> agreeing(const Map& H, const std::vector<Pair>& pairs, Bound b
     const Map back = H.inverse();
     std::vector<bool> marks;
     for (const Pair& p : pairs) {
-        const Point there = H.at(p.first), here = back.at(p.second);
-        marks.push_back(std::hypot(there.x - p.second.x, there.y - p.second.y) < bound.second ||
-                        std::hypot(here.x - p.first.x, here.y - p.first.y) < bound.first);
+        marks.push_back(distance(H.at(p.first), p.second) < bound.second || distance(back.at(p.second), p.first) < bound.first);
     }
     return marks;
 }

@@ -177,9 +177,9 @@ private:
 };
 
 const Level& nearestLevel(const Pyramid& pyramid, double scale) {
-    return *std::min_element(pyramid.levels.begin(), pyramid.levels.end(), [scale](const Level& a, const Level& b) {
-        return std::fabs(std::log(a.scale / scale)) < std::fabs(std::log(b.scale / scale));
-    });
+    const auto ratio = [scale](const Level& level) { return std::max(level.scale / scale, scale / level.scale); };
+    return *std::min_element(pyramid.levels.begin(), pyramid.levels.end(),
+                             [&](const Level& a, const Level& b) { return ratio(a) < ratio(b); });
 }
 
 // The places of a picture that a homography takes into another one, and the median of the areas that a pixel becomes there.

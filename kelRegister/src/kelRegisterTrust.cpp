@@ -70,7 +70,7 @@ Map unitsOf(const std::vector<Pair>& pairs) {
         y += p.first.y / n;
     }
     for (const Pair& p : pairs)
-        extent = std::max(extent, std::hypot(p.first.x - x, p.first.y - y));
+        extent = std::max(extent, distance(p.first, {x, y}));
     return {{extent, 0, x, 0, extent, y, 0, 0, 1}};
 }
 

@@ -2,6 +2,7 @@
 #ifndef KEL_REGISTER_PRIVATE_H
 #define KEL_REGISTER_PRIVATE_H
 
+#include <cmath>
 #include <cstddef>
 #include <cstdint>
 #include <string>
@@ -33,6 +34,11 @@ inline uint8_t* rowOf(const kelImage_t* image, int y) {
 struct Point {
     double x, y;
 };
+
+// By a root, which every processor rounds correctly; std::hypot differs in the last bit between them.
+inline double distance(Point a, Point b) {
+    return std::sqrt((a.x - b.x) * (a.x - b.x) + (a.y - b.y) * (a.y - b.y));
+}
 
 // A homography in double precision, row by row.
 struct Map {

@@ -410,6 +410,8 @@ TEST(RandomIndex, DrawsInOrderAndLetsTheThirdOfFourEqualTheFirst) {
         EXPECT_EQ((1 << a | 1 << b | 1 << c | 1 << d | 1 << e | 1 << f), 63);
     }
     EXPECT_TRUE(thirdIsFirst);
+    EXPECT_DIVISION_BY_ZERO(getRandomIndex(a, b, c, d, 0));
+    EXPECT_DIVISION_BY_ZERO(getRandomIndex(0, a, b, c, d, e, f));
 }
 
 TEST(Plausibility, HasAbsoluteBoundsThatNaNPasses) {
