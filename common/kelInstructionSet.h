@@ -12,11 +12,11 @@
 
 namespace kel {
 
-// AVX-512 (F, BW, VL and VBMI), AVX2, or what every x86 processor has that kel runs on.
+// AVX-512 (F, BW, VL and VBMI), AVX2 and FMA, or what every x86 processor has that kel runs on.
 template <class Table> const Table& widest(const Table& sse41, const Table& avx2, const Table& avx512) {
     if (__builtin_cpu_supports("avx512bw") && __builtin_cpu_supports("avx512vl") && __builtin_cpu_supports("avx512vbmi"))
         return avx512;
-    return __builtin_cpu_supports("avx2") ? avx2 : sse41;
+    return __builtin_cpu_supports("avx2") && __builtin_cpu_supports("fma") ? avx2 : sse41;
 }
 
 } // namespace kel

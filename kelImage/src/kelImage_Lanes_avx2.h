@@ -1,4 +1,4 @@
-// The vocabulary of kernels for AVX2: two lanes of 128 bits, and one for what is left of a row. What the names mean stands in
+// The vocabulary of kernels for AVX2 and FMA: two lanes of 128 bits, and one for what is left of a row. What the names mean stands in
 // the vocabulary for SSE4.1.
 #ifndef KEL_IMAGE_LANES_AVX2_H
 #define KEL_IMAGE_LANES_AVX2_H
@@ -30,7 +30,12 @@ struct Lanes2 {
     static Lanes2 bytes(int value) { return {_mm256_set1_epi8(static_cast<char>(value))}; }
     static Lanes2 words(int value) { return {_mm256_set1_epi16(static_cast<short>(value))}; }
     static Lanes2 longs(int value) { return {_mm256_set1_epi32(value)}; }
-    static Lanes2 every(const Sixteen& lane) { return {_mm256_broadcastsi128_si256(Lanes1::every(lane).v)}; }
+    // Said in assembly, as GCC builds constants that repeat themselves anew in every turn of a loop that has more than registers.
+    static Lanes2 every(const Sixteen& lane) {
+        __m256i v;
+        __asm__("vbroadcasti128 %1, %0" : "=x"(v) : "m"(lane));
+        return {v};
+    }
     static Lanes2 ascendingLongs() { return {_mm256_setr_epi32(0, 1, 2, 3, 4, 5, 6, 7)}; }
     static Floats2 floats(float value) { return {_mm256_set1_ps(value)}; }
 };
@@ -140,6 +145,9 @@ inline Lanes2 minWords(Lanes2 a, Lanes2 b) {
 inline Lanes2 maxWords(Lanes2 a, Lanes2 b) {
     return {_mm256_max_epi16(a.v, b.v)};
 }
+inline Lanes2 minUnsignedWords(Lanes2 a, Lanes2 b) {
+    return {_mm256_min_epu16(a.v, b.v)};
+}
 inline Lanes2 greaterWords(Lanes2 a, Lanes2 b) {
     return {_mm256_cmpgt_epi16(a.v, b.v)};
 }
@@ -199,6 +207,10 @@ template <int n> Lanes2 shiftRightLongs(Lanes2 a) {
     return {_mm256_srli_epi32(a.v, n)};
 }
 
+inline Lanes2 upperWords(Lanes2 a, Lanes2 b) {
+    return {_mm256_blend_epi16(_mm256_srli_epi32(a.v, 16), b.v, 0xaa)};
+}
+
 inline Lanes2 packWords(Lanes2 a, Lanes2 b) {
     return {_mm256_packus_epi16(a.v, b.v)};
 }
@@ -238,11 +250,11 @@ inline Floats2 operator/(Floats2 a, Floats2 b) {
 inline Floats2 rootOf(Floats2 a) {
     return {_mm256_sqrt_ps(a.f)};
 }
-inline Floats2 bitsAsFloats(Lanes2 longs) {
-    return {_mm256_castsi256_ps(longs.v)};
-}
 inline Floats2 floatsOf(Lanes2 longs) {
     return {_mm256_cvtepi32_ps(longs.v)};
+}
+inline Floats2 timesDifference(Lanes2 a, int b, float factor) {
+    return {_mm256_fmsub_ps(_mm256_cvtepi32_ps(a.v), _mm256_set1_ps(factor), _mm256_set1_ps(static_cast<float>(b) * factor))};
 }
 inline Lanes2 rounded(Floats2 a) {
     return {_mm256_cvtps_epi32(a.f)};

@@ -179,6 +179,9 @@ inline Lanes4 minWords(Lanes4 a, Lanes4 b) {
 inline Lanes4 maxWords(Lanes4 a, Lanes4 b) {
     return {_mm512_max_epi16(a.v, b.v)};
 }
+inline Lanes4 minUnsignedWords(Lanes4 a, Lanes4 b) {
+    return {_mm512_min_epu16(a.v, b.v)};
+}
 inline Lanes4 greaterWords(Lanes4 a, Lanes4 b) {
     return {_mm512_movm_epi16(_mm512_cmpgt_epi16_mask(a.v, b.v))};
 }
@@ -237,6 +240,10 @@ template <int n> Lanes4 shiftRightLongs(Lanes4 a) {
     return {_mm512_srli_epi32(a.v, n)};
 }
 
+inline Lanes4 upperWords(Lanes4 a, Lanes4 b) {
+    return {_mm512_mask_blend_epi16(0xaaaaaaaa, _mm512_srli_epi32(a.v, 16), b.v)};
+}
+
 inline Lanes4 packWords(Lanes4 a, Lanes4 b) {
     return {_mm512_packus_epi16(a.v, b.v)};
 }
@@ -276,11 +283,11 @@ inline Floats4 operator/(Floats4 a, Floats4 b) {
 inline Floats4 rootOf(Floats4 a) {
     return {_mm512_sqrt_ps(a.f)};
 }
-inline Floats4 bitsAsFloats(Lanes4 longs) {
-    return {_mm512_castsi512_ps(longs.v)};
-}
 inline Floats4 floatsOf(Lanes4 longs) {
     return {_mm512_cvtepi32_ps(longs.v)};
+}
+inline Floats4 timesDifference(Lanes4 a, int b, float factor) {
+    return {_mm512_fmsub_ps(_mm512_cvtepi32_ps(a.v), _mm512_set1_ps(factor), _mm512_set1_ps(static_cast<float>(b) * factor))};
 }
 inline Lanes4 rounded(Floats4 a) {
     return {_mm512_cvtps_epi32(a.f)};

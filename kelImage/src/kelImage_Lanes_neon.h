@@ -165,6 +165,9 @@ inline Lanes1 minWords(Lanes1 a, Lanes1 b) {
 inline Lanes1 maxWords(Lanes1 a, Lanes1 b) {
     return vmaxq_s16(a.s16(), b.s16());
 }
+inline Lanes1 minUnsignedWords(Lanes1 a, Lanes1 b) {
+    return vminq_u16(a.u16(), b.u16());
+}
 inline Lanes1 greaterWords(Lanes1 a, Lanes1 b) {
     return vcgtq_s16(a.s16(), b.s16());
 }
@@ -231,6 +234,9 @@ template <int n> Lanes1 shiftRightLongs(Lanes1 a) {
     return vshrq_n_u32(a.u32(), n);
 }
 
+inline Lanes1 upperWords(Lanes1 a, Lanes1 b) {
+    return vtrn2q_s16(a.s16(), b.s16());
+}
 inline Lanes1 packWords(Lanes1 a, Lanes1 b) {
     return vqmovun_high_s16(vqmovun_s16(a.s16()), b.s16());
 }
@@ -268,11 +274,11 @@ inline Floats1 operator/(Floats1 a, Floats1 b) {
 inline Floats1 rootOf(Floats1 a) {
     return {vsqrtq_f32(a.f)};
 }
-inline Floats1 bitsAsFloats(Lanes1 longs) {
-    return {vreinterpretq_f32_u8(longs.v)};
-}
 inline Floats1 floatsOf(Lanes1 longs) {
     return {vcvtq_f32_s32(longs.s32())};
+}
+inline Floats1 timesDifference(Lanes1 a, int b, float factor) {
+    return {vfmaq_n_f32(vdupq_n_f32(-(static_cast<float>(b) * factor)), floatsOf(a).f, factor)};
 }
 // The instruction gives the nearest long of what no long holds, and 0 for NaN, where x86 gives the least long.
 inline Lanes1 truncated(Floats1 a) {

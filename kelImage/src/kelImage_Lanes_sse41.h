@@ -177,6 +177,9 @@ inline Lanes1 minWords(Lanes1 a, Lanes1 b) { // signed
 inline Lanes1 maxWords(Lanes1 a, Lanes1 b) {
     return {_mm_max_epi16(a.v, b.v)};
 }
+inline Lanes1 minUnsignedWords(Lanes1 a, Lanes1 b) {
+    return {_mm_min_epu16(a.v, b.v)};
+}
 inline Lanes1 greaterWords(Lanes1 a, Lanes1 b) { // all ones where a > b, signed, else 0
     return {_mm_cmpgt_epi16(a.v, b.v)};
 }
@@ -238,6 +241,11 @@ template <int n> Lanes1 shiftRightLongs(Lanes1 a) { // zeros come in
     return {_mm_srli_epi32(a.v, n)};
 }
 
+// The upper words of the longs of a and of b, in turn: a0 b0 a1 b1 ..
+inline Lanes1 upperWords(Lanes1 a, Lanes1 b) {
+    return {_mm_blend_epi16(_mm_srli_epi32(a.v, 16), b.v, 0xaa)};
+}
+
 // Signed words as bytes 0..255 and signed longs as signed words, saturating: a lane of a, then one of b.
 inline Lanes1 packWords(Lanes1 a, Lanes1 b) {
     return {_mm_packus_epi16(a.v, b.v)};
@@ -280,12 +288,13 @@ inline Floats1 operator/(Floats1 a, Floats1 b) {
 inline Floats1 rootOf(Floats1 a) {
     return {_mm_sqrt_ps(a.f)};
 }
-// The bits of longs as floats.
-inline Floats1 bitsAsFloats(Lanes1 longs) {
-    return {_mm_castsi128_ps(longs.v)};
-}
 inline Floats1 floatsOf(Lanes1 longs) {
     return {_mm_cvtepi32_ps(longs.v)};
+}
+// (a - b) * factor of longs 0 .. 2^23 - 1, rounded once; both a - b and b * factor have to be exact in single precision.
+inline Floats1 timesDifference(Lanes1 a, int b, float factor) {
+    const __m128 base = _mm_set1_ps(8388608.0f + static_cast<float>(b)); // what 2^23 with a as its last bits is more than a - b
+    return {_mm_mul_ps(_mm_sub_ps(_mm_castsi128_ps(_mm_or_si128(a.v, _mm_set1_epi32(0x4b000000))), base), _mm_set1_ps(factor))};
 }
 // Longs by the thread's rounding mode, and toward zero. What no long holds, and NaN, becomes the least long.
 inline Lanes1 rounded(Floats1 a) {

@@ -7,7 +7,7 @@ const Kernels& kernels() {
 #ifdef __aarch64__
     return kKernelsNeon;
 #else
-    return __builtin_cpu_supports("avx2") ? kKernelsAvx2 : kKernelsSse;
+    return __builtin_cpu_supports("avx2") && __builtin_cpu_supports("fma") ? kKernelsAvx2 : kKernelsSse;
 #endif
 }
 
