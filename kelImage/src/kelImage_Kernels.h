@@ -23,7 +23,7 @@ struct WarpSource {
 };
 using WarpRow = void (*)(uint8_t* d, ptrdiff_t width, float y, const float* h, const WarpSource& src);
 
-using ReduceAcross = void (*)(uint32_t* d, const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t pairs,
+using ReduceAcross = void (*)(uint32_t* d, const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t groups,
                               ptrdiff_t width, uint32_t box);
 using ReduceDown = void (*)(uint8_t* d, const uint8_t* const* row, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t bytes,
                             uint32_t box);

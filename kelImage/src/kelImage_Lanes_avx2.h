@@ -26,6 +26,9 @@ struct Lanes2 {
     static Lanes2 loadEights(const void* p, const int32_t* index, ptrdiff_t apart) {
         return of(Lanes1::loadEights(p, index, 0), Lanes1::loadEights(p, index + apart, 0));
     }
+    static Lanes2 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t apart) {
+        return of(Lanes1::load(p + index[0]), Lanes1::load(p + index[apart]));
+    }
     static Lanes2 zero() { return {_mm256_setzero_si256()}; }
     static Lanes2 bytes(int value) { return {_mm256_set1_epi8(static_cast<char>(value))}; }
     static Lanes2 words(int value) { return {_mm256_set1_epi16(static_cast<short>(value))}; }
@@ -191,11 +194,6 @@ inline Lanes2 minLongs(Lanes2 a, Lanes2 b) {
 }
 inline Lanes2 mulLongs(Lanes2 a, Lanes2 b) {
     return {_mm256_mullo_epi32(a.v, b.v)};
-}
-inline Lanes2 mulHighLongs(Lanes2 a, Lanes2 b) {
-    const __m256i even = _mm256_srli_epi64(_mm256_mul_epu32(a.v, b.v), 32);
-    const __m256i odd = _mm256_mul_epu32(_mm256_srli_epi64(a.v, 32), _mm256_srli_epi64(b.v, 32));
-    return {_mm256_blend_epi16(even, odd, 0xcc)};
 }
 inline Lanes2 greaterLongs(Lanes2 a, Lanes2 b) {
     return {_mm256_cmpgt_epi32(a.v, b.v)};

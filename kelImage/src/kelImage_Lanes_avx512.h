@@ -33,6 +33,10 @@ struct Lanes4 {
         return of(Lanes1::loadEights(p, index, 0), Lanes1::loadEights(p, index + apart, 0),
                   Lanes1::loadEights(p, index + 2 * apart, 0), Lanes1::loadEights(p, index + 3 * apart, 0));
     }
+    static Lanes4 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t apart) {
+        return of(Lanes1::load(p + index[0]), Lanes1::load(p + index[apart]), Lanes1::load(p + index[2 * apart]),
+                  Lanes1::load(p + index[3 * apart]));
+    }
     static Lanes4 zero() { return {_mm512_setzero_si512()}; }
     static Lanes4 bytes(int value) { return {_mm512_set1_epi8(static_cast<char>(value))}; }
     static Lanes4 words(int value) { return {_mm512_set1_epi16(static_cast<short>(value))}; }
@@ -224,11 +228,6 @@ inline Lanes4 minLongs(Lanes4 a, Lanes4 b) {
 }
 inline Lanes4 mulLongs(Lanes4 a, Lanes4 b) {
     return {_mm512_mullo_epi32(a.v, b.v)};
-}
-inline Lanes4 mulHighLongs(Lanes4 a, Lanes4 b) {
-    const __m512i even = _mm512_srli_epi64(_mm512_mul_epu32(a.v, b.v), 32);
-    const __m512i odd = _mm512_mul_epu32(_mm512_srli_epi64(a.v, 32), _mm512_srli_epi64(b.v, 32));
-    return {_mm512_mask_blend_epi16(0xcccccccc, even, odd)};
 }
 inline Lanes4 greaterLongs(Lanes4 a, Lanes4 b) {
     return {_mm512_maskz_set1_epi32(_mm512_cmpgt_epi32_mask(a.v, b.v), -1)};

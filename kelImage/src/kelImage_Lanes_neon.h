@@ -47,6 +47,7 @@ struct Lanes1 {
         const auto* const base = static_cast<const uint8_t*>(p);
         return vcombine_u8(vld1_u8(base + 4 * ptrdiff_t(index[0])), vld1_u8(base + 4 * ptrdiff_t(index[1])));
     }
+    static Lanes1 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t) { return load(p + index[0]); }
     static Lanes1 zero() { return vdupq_n_u8(0); }
     static Lanes1 bytes(int value) { return vdupq_n_u8(static_cast<uint8_t>(value)); }
     static Lanes1 words(int value) { return vdupq_n_u16(static_cast<uint16_t>(value)); }
@@ -219,10 +220,6 @@ inline Lanes1 minLongs(Lanes1 a, Lanes1 b) {
 }
 inline Lanes1 mulLongs(Lanes1 a, Lanes1 b) {
     return vmulq_u32(a.u32(), b.u32());
-}
-inline Lanes1 mulHighLongs(Lanes1 a, Lanes1 b) {
-    const uint64x2_t low = vmull_u32(vget_low_u32(a.u32()), vget_low_u32(b.u32())), high = vmull_high_u32(a.u32(), b.u32());
-    return vuzp2q_u32(vreinterpretq_u32_u64(low), vreinterpretq_u32_u64(high));
 }
 inline Lanes1 greaterLongs(Lanes1 a, Lanes1 b) {
     return vcgtq_s32(a.s32(), b.s32());

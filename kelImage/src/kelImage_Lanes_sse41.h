@@ -46,6 +46,8 @@ struct Lanes1 {
         const __m128i second = _mm_loadl_epi64(reinterpret_cast<const __m128i*>(base + 4 * ptrdiff_t(index[1])));
         return {_mm_unpacklo_epi64(first, second)};
     }
+    // Lane k from p + 4 * index[k * apart].
+    static Lanes1 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t) { return load(p + index[0]); }
     static Lanes1 zero() { return {_mm_setzero_si128()}; }
     static Lanes1 bytes(int value) { return {_mm_set1_epi8(static_cast<char>(value))}; }
     static Lanes1 words(int value) { return {_mm_set1_epi16(static_cast<short>(value))}; }
@@ -225,11 +227,6 @@ inline Lanes1 minLongs(Lanes1 a, Lanes1 b) { // signed
 }
 inline Lanes1 mulLongs(Lanes1 a, Lanes1 b) {
     return {_mm_mullo_epi32(a.v, b.v)};
-}
-inline Lanes1 mulHighLongs(Lanes1 a, Lanes1 b) { // the upper 32 bits, unsigned
-    const __m128i even = _mm_srli_epi64(_mm_mul_epu32(a.v, b.v), 32);
-    const __m128i odd = _mm_mul_epu32(_mm_srli_epi64(a.v, 32), _mm_srli_epi64(b.v, 32));
-    return {_mm_blend_epi16(even, odd, 0xcc)};
 }
 inline Lanes1 greaterLongs(Lanes1 a, Lanes1 b) {
     return {_mm_cmpgt_epi32(a.v, b.v)};

@@ -15,7 +15,7 @@ using kel::Kernels;
 using kel::rowByWidth;
 
 // Weights of boxes up to here are bytes, up to there words; the kernels say why.
-constexpr int64_t kByteBox = 16, kWordBox = 4103;
+constexpr int64_t kByteBox = 16, kWordBox = 2 * 4103;
 
 // The inputs under one output: the first counts `head` times, the last `tail` times, those between `repeat` times. Where one
 // input alone is under the box, head is the whole box and tail 0.
@@ -27,10 +27,11 @@ struct Box {
 struct Ratio {
     int64_t repeat, box;
 
-    // A box of one is taken as two of the same input twice: its reciprocal would be too large for the kernels.
+    // A box of one is taken as two of the same input twice: its reciprocal would be too large for the kernels, to which boxes beyond
+    // bytes have to be even.
     Ratio(kelValue_s32 outputs, kelValue_s32 inputs) : repeat(outputs), box(inputs) {
         const kelValue_s32 common = kel::divisor(kel::gcd(outputs, inputs));
-        const int twice = inputs == common ? 2 : 1;
+        const int twice = inputs == common || box / common > kByteBox ? 2 : 1;
         repeat = repeat / common * twice;
         box = box / common * twice;
     }
@@ -45,12 +46,12 @@ struct Ratio {
     int64_t weight(const Box& at, kelValue_s32 input) const { // 0 for inputs behind the last
         return input == at.first ? at.head : input < at.last ? repeat : input == at.last ? at.tail : 0;
     }
-    // Pairs of inputs under any of the first `outputs` boxes.
-    kelValue_s32 pairs(kelValue_s32 outputs) const {
+    // Groups of so many inputs under any of the first `outputs` boxes.
+    kelValue_s32 groups(kelValue_s32 outputs, kelValue_s32 inputs) const {
         kelValue_s32 most = 0;
         for (kelValue_s32 i = 0; i < outputs; ++i)
             most = std::max(most, at(i).last - at(i).first + 1);
-        return (most + 1) / 2;
+        return (most + inputs - 1) / inputs;
     }
 };
 
@@ -58,39 +59,40 @@ struct Ratio {
 class Across {
 public:
     Across(const Kernels& kernels, kelValue_s32 outputs, kelValue_s32 inputs)
-        : m_ratio(outputs, inputs), m_outputs(outputs), m_pitch(kel::wholeFours(outputs)), m_pairs(m_ratio.pairs(outputs)),
-          m_reduce(inputs < 2 || m_ratio.box > kWordBox ? nullptr
-                   : m_ratio.box > kByteBox             ? kernels.reduceAcrossByWords
-                                                        : kernels.reduceAcrossByBytes) {
+        : m_ratio(outputs, inputs), m_outputs(outputs), m_pitch(kel::wholeFours(outputs)),
+          m_together(m_ratio.box > kByteBox ? 4 : 2), m_groups(m_ratio.groups(outputs, m_together)),
+          m_reduce(inputs < m_together || m_ratio.box > kWordBox ? nullptr
+                   : m_together == 4                             ? kernels.reduceAcrossByWords
+                                                                 : kernels.reduceAcrossByBytes) {
         if (m_reduce)
             fillTables(inputs);
     }
     bool isHalf() const { return m_ratio.isHalf(); }
     void operator()(uint32_t* to, const uint32_t* from) const {
         if (m_reduce)
-            return m_reduce(to, from, m_index.get(), m_weights.get(), m_pairs, m_pitch, static_cast<uint32_t>(m_ratio.box));
+            return m_reduce(to, from, m_index.get(), m_weights.get(), m_groups, m_pitch, static_cast<uint32_t>(m_ratio.box));
         for (kelValue_s32 i = 0; i < m_outputs; ++i)
             to[i] = plainAverage(from, m_ratio.at(i));
     }
 
 private:
-    // Every pair of inputs of every output: where it starts, and its weights side by side, bytes of them four times. The last
-    // input comes as the second of its pair, so that nothing behind it is read.
+    // Every group of inputs of every output: where it starts, and its weights side by side, bytes of a pair four times. The last
+    // input comes as the last of its group, so that nothing behind it is read.
     void fillTables(kelValue_s32 inputs) {
-        const bool words = m_ratio.box > kByteBox;
-        const ptrdiff_t count = m_pairs * m_pitch, each = words ? 2 : 4;
+        const ptrdiff_t count = m_groups * m_pitch;
         m_index = allocate<int32_t>(count);
-        m_weights = allocate<uint16_t>(each * count);
+        m_weights = allocate<uint16_t>(4 * count);
         for (ptrdiff_t i = 0; i < count; ++i) {
             const Box box = m_ratio.at(static_cast<kelValue_s32>(std::min<ptrdiff_t>(i % m_pitch, m_outputs - 1)));
-            const int64_t wanted = box.first + 2 * (i / m_pitch), index = std::min<int64_t>(wanted, inputs - 2);
+            const int64_t wanted = box.first + m_together * (i / m_pitch),
+                          index = std::min<int64_t>(wanted, inputs - m_together);
             const auto weight = [&](int64_t k) {
                 return static_cast<uint16_t>(k < wanted ? 0 : m_ratio.weight(box, static_cast<kelValue_s32>(k)));
             };
-            const uint16_t first = weight(index), second = weight(index + 1);
             m_index[i] = static_cast<int32_t>(index);
-            for (ptrdiff_t k = 0; k < each; ++k)
-                m_weights[each * i + k] = static_cast<uint16_t>(!words ? first | second << 8 : k % 2 ? second : first);
+            for (ptrdiff_t k = 0; k < 4; ++k)
+                m_weights[4 * i + k] =
+                    static_cast<uint16_t>(m_together == 4 ? weight(index + k) : weight(index) | weight(index + 1) << 8);
         }
     }
     uint32_t plainAverage(const uint32_t* from, const Box& box) const {
@@ -107,7 +109,7 @@ private:
     Ratio m_ratio;
     kelValue_s32 m_outputs;
     ptrdiff_t m_pitch;
-    kelValue_s32 m_pairs;
+    kelValue_s32 m_together, m_groups; // inputs of a group, groups of an output
     kel::ReduceAcross m_reduce;
     Buffer<int32_t> m_index;
     Buffer<uint16_t> m_weights;
@@ -117,7 +119,7 @@ private:
 class Down {
 public:
     Down(const Kernels& kernels, kelValue_s32 outputs, kelValue_s32 inputs)
-        : m_ratio(outputs, inputs), m_rows(2 * m_ratio.pairs(outputs)), m_row(allocate<const uint8_t*>(m_rows)),
+        : m_ratio(outputs, inputs), m_rows(2 * m_ratio.groups(outputs, 2)), m_row(allocate<const uint8_t*>(m_rows)),
           m_weights(allocate<uint16_t>(m_rows)), m_reduce(m_ratio.box > kWordBox   ? nullptr
                                                           : m_ratio.box > kByteBox ? kernels.reduceDownByWords
                                                                                    : kernels.reduceDownByBytes) {}

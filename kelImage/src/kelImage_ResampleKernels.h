@@ -79,13 +79,12 @@ void mixRows(uint8_t* d, const uint8_t* above, const uint8_t* below, int weight,
         d[i] = static_cast<uint8_t>((above[i] * (256 - weight) + below[i] * weight) >> 8);
 }
 
-// ---- Reduction of four-byte pixels: averages of inputs under a box, each with its weight, rounding down. Inputs come in pairs
-// with their weights side by side. Division by the box is a multiplication with its reciprocal, rounded up: exact in 16 bits
-// while 255 * box * box < 2^16, in 32 bits for boxes up to 4103.
+// ---- Reduction of four-byte pixels: averages of inputs under a box, each with its weight, rounding down. Of a row, inputs come
+// in groups of neighbours, of rows in pairs, with their weights side by side. Four words of weights go with a group and a pixel.
 
-// Weights up to 16: sums are words of at most 255 * 16.
+// Weights up to 16: sums are words of at most 255 * 16. Groups are pairs, their weights two bytes, four times. Division by the box
+// is a multiplication with its reciprocal, rounded up: exact while 255 * box * box < 2^16.
 struct WordBox {
-    static constexpr int kWordsOfWeights = 4; // of a pixel and a pair of inputs: two bytes, four times
     uint32_t reciprocal;
     explicit WordBox(uint32_t box) : reciprocal((65536 + box - 1) / box) {}
 
@@ -119,29 +118,29 @@ private:
     template <class V> V divided(V sums) const { return mulHighWords(sums, V::words(static_cast<int>(reciprocal))); }
 };
 
-// One pixel of an eight, and its neighbour, side by side as words of four channels; and its weights from those of four pixels.
+// One pixel of four and its neighbour side by side as words of four channels, and their weights of four.
 template <int first>
 constexpr Sixteen kWordsSideBySide = {
     {first, -1, first + 4, -1, first + 1, -1, first + 5, -1, first + 2, -1, first + 6, -1, first + 3, -1, first + 7, -1}};
 template <int n>
 constexpr Sixteen kLong = {{n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3}};
 
-// Weights up to 4103: sums are longs.
+// Weights and the box are even, the box up to 8206, and so are sums, longs below 2^21. Groups are fours. One more than a sum over the box
+// is off by less than 256 / 2^22 in single precision, however the thread rounds, and 1 / 8206 or more from whole numbers.
 struct LongBox {
-    static constexpr int kWordsOfWeights = 2;
-    uint32_t reciprocal;
-    explicit LongBox(uint32_t box) : reciprocal(static_cast<uint32_t>(((uint64_t(1) << 32) + box - 1) / box)) {}
+    float reciprocal;
+    explicit LongBox(uint32_t box) : reciprocal(1 / static_cast<float>(box)) {}
 
     template <class V>
-    V across(const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t pitch) const {
-        const V first = V::every(kWordsSideBySide<0>), second = V::every(kWordsSideBySide<8>);
+    V across(const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t fours, ptrdiff_t pitch) const {
         V a = V::zero(), b = a, c = a, d = a;
-        for (ptrdiff_t k = 0; k < pairs; ++k, index += pitch, weights += 2 * pitch) {
-            const V ab = V::loadEights(s, index, 4), cd = V::loadEights(s, index + 2, 4), w = V::load(weights);
-            a = addLongs(a, weighWords(shuffle(ab, first), shuffle(w, V::every(kLong<0>))));
-            b = addLongs(b, weighWords(shuffle(ab, second), shuffle(w, V::every(kLong<4>))));
-            c = addLongs(c, weighWords(shuffle(cd, first), shuffle(w, V::every(kLong<8>))));
-            d = addLongs(d, weighWords(shuffle(cd, second), shuffle(w, V::every(kLong<12>))));
+        for (ptrdiff_t k = 0; k < fours; ++k, index += pitch, weights += 4 * pitch) {
+            const auto* const w = reinterpret_cast<const uint8_t*>(weights);
+            const V ofAB = V::loadLanes(w, 32), ofCD = V::loadLanes(w + 16, 32);
+            a = addLongs(a, weighedFour<0>(V::loadSixteens(s, index, 4), ofAB));
+            b = addLongs(b, weighedFour<8>(V::loadSixteens(s, index + 1, 4), ofAB));
+            c = addLongs(c, weighedFour<0>(V::loadSixteens(s, index + 2, 4), ofCD));
+            d = addLongs(d, weighedFour<8>(V::loadSixteens(s, index + 3, 4), ofCD));
         }
         return packWords(packLongs(divided(a), divided(b)), packLongs(divided(c), divided(d)));
     }
@@ -159,17 +158,21 @@ struct LongBox {
     }
 
 private:
-    template <class V> V divided(V sums) const { return mulHighLongs(sums, V::longs(static_cast<int>(reciprocal))); }
+    template <int n, class V> static V weighedFour(V pixels, V weights) {
+        return addLongs(weighWords(shuffle(pixels, V::every(kWordsSideBySide<0>)), shuffle(weights, V::every(kLong<n>))),
+                        weighWords(shuffle(pixels, V::every(kWordsSideBySide<8>)), shuffle(weights, V::every(kLong<n + 4>))));
+    }
+    template <class V> V divided(V sums) const { return truncated(timesDifference(sums, -1, reciprocal)); }
 };
 
-// Pixel i averages the pairs of neighbours from s[index[i]], s[index[pitch + i]], ... on; `width`, a multiple of 4, is the
+// Pixel i averages the groups of neighbours from s[index[i]], s[index[pitch + i]], ... on; `width`, a multiple of 4, is the
 // pitch of both tables in pixels.
 template <class Box>
-void reduceAcross(uint32_t* d, const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t pairs,
+void reduceAcross(uint32_t* d, const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t groups,
                   ptrdiff_t width, uint32_t box) {
     const Box by(box);
     walkColumns<4>(0, width, [=](auto of, ptrdiff_t i) {
-        store(d + i, by.template across<LanesOf<decltype(of)>>(s, index + i, weights + Box::kWordsOfWeights * i, pairs, width));
+        store(d + i, by.template across<LanesOf<decltype(of)>>(s, index + i, weights + 4 * i, groups, width));
     });
 }
 
