@@ -14,6 +14,9 @@ set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
 set(CMAKE_LIBRARY_ARCHITECTURE aarch64-linux-gnu)
 set(ENV{PKG_CONFIG_LIBDIR} ${KEL_ARM64_ROOT}/usr/lib/aarch64-linux-gnu/pkgconfig)
 set(ENV{PKG_CONFIG_SYSROOT_DIR} ${KEL_ARM64_ROOT})
+foreach(language C CXX) # headers that differ between architectures
+  set(CMAKE_${language}_FLAGS_INIT "-isystem ${KEL_ARM64_ROOT}/usr/include/aarch64-linux-gnu")
+endforeach()
 foreach(kind EXE SHARED) # what the libraries there need themselves
   string(APPEND CMAKE_${kind}_LINKER_FLAGS_INIT " -Wl,-rpath-link,${KEL_ARM64_ROOT}/usr/lib/aarch64-linux-gnu:${KEL_ARM64_ROOT}/lib/aarch64-linux-gnu")
 endforeach()

@@ -4,7 +4,9 @@
 namespace kelRegister {
 
 const Kernels& kernels() {
-#ifdef __aarch64__
+#if defined(KEL_KERNELS) // one table whatever the processor, for tests
+    return KEL_KERNELS;
+#elif defined(__aarch64__)
     return kKernelsNeon;
 #else
     return __builtin_cpu_supports("avx2") && __builtin_cpu_supports("fma") ? kKernelsAvx2 : kKernelsSse;

