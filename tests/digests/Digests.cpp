@@ -87,10 +87,10 @@ void digest(const MatOperation& o) {
     digest.print(o.name);
 }
 
-// Turns by angles of up to 18 radians, within which the C library's sines and cosines are the same everywhere.
+// Turns by angles of up to 17 radians, within which the C library's sines and cosines are the same everywhere.
 void digestTurns() {
     Digest digest;
-    for (float degrees = -1031; degrees <= 1031; degrees += 0.0625f) {
+    for (float degrees = -974; degrees <= 974; degrees += 0.0625f) {
         kelMat turn;
         turn.setDataRotationMatrix_Z_3x3(degrees);
         digest.add(turn);
