@@ -39,24 +39,20 @@ Point pointOf(const Feature& f) {
     return {f.x, f.y};
 }
 
-// A picture on its way through the stages, or why it is not.
-struct Ready {
-    std::string reason;
-    Pyramid pyramid;
-    std::vector<Feature> features;
-    int mostFeatures = 0;
-
-    Ready(const kelImage_t* picture, const char* name, const Options& options) {
-        reason = whyWrong(options);
-        if (reason.empty())
-            reason = whyUnusable(picture, name);
-        if (!reason.empty())
-            return;
-        pyramid = makePyramid(greyOf(picture), options.workingSize);
-        features = findFeatures(pyramid, options.mostFeatures);
-        mostFeatures = options.mostFeatures;
-    }
-};
+Ready makeReady(const kelImage_t* picture, const char* name, const Options& options) {
+    Ready ready;
+    ready.reason = whyWrong(options);
+    if (ready.reason.empty())
+        ready.reason = whyUnusable(picture, name);
+    if (!ready.reason.empty())
+        return ready;
+    ready.pyramid = makePyramid(greyOf(picture), options.workingSize);
+    ready.features = findFeatures(ready.pyramid, options.mostFeatures);
+    ready.mostFeatures = options.mostFeatures;
+    for (Level& level : ready.pyramid.levels)
+        level.cross = Image(); // two thirds of the memory
+    return ready;
+}
 
 // From matching to the verdict.
 class Registration {
@@ -178,10 +174,12 @@ Result registered(const Ready& first, const Ready& second, const Options& option
 } // namespace
 
 struct Prepared::Body : Ready {
-    using Ready::Ready;
+    explicit Body(Ready ready) : Ready(std::move(ready)) {}
 };
 
-Prepared::Prepared(const kelImage_t* picture, const Options& options) : m_body(new Body(picture, "given", options)) {}
+Prepared::Prepared(std::unique_ptr<Body> body) : m_body(std::move(body)) {}
+Prepared::Prepared(const kelImage_t* picture, const Options& options)
+    : m_body(new Body(makeReady(picture, "given", options))) {}
 Prepared::Prepared(Prepared&& other) noexcept = default;
 Prepared& Prepared::operator=(Prepared&& other) noexcept = default;
 Prepared::~Prepared() = default;
@@ -190,19 +188,27 @@ const std::string& Prepared::reason() const {
     return m_body->reason;
 }
 
+std::vector<unsigned char> Prepared::store() const {
+    return reason().empty() ? kelRegister::store(*m_body) : std::vector<unsigned char>();
+}
+
+Prepared Prepared::restored(const void* bytes, size_t size) {
+    return Prepared(std::unique_ptr<Body>(new Body(kelRegister::restored(static_cast<const unsigned char*>(bytes), size))));
+}
+
 Result registerPictures(const Prepared& first, const Prepared& second, const Options& options) {
     return registered(*first.m_body, *second.m_body, options);
 }
 
 std::vector<Feature> findFeatures(const kelImage_t* picture, const Options& options, std::string* reason) {
-    Ready ready(picture, "given", options);
+    Ready ready = makeReady(picture, "given", options);
     if (reason && !ready.reason.empty())
         *reason = ready.reason;
     return std::move(ready.features);
 }
 
 Result registerPictures(const kelImage_t* first, const kelImage_t* second, const Options& options) {
-    return registered(Ready(first, "first", options), Ready(second, "second", options), options);
+    return registered(makeReady(first, "first", options), makeReady(second, "second", options), options);
 }
 
 } // namespace kelRegister

@@ -14,6 +14,7 @@
 #ifndef KEL_REGISTER_H
 #define KEL_REGISTER_H
 
+#include <cstddef>
 #include <kel/kelImage.h>
 #include <kel/kelMat.h>
 #include <memory>
@@ -115,12 +116,28 @@ public:
     KEL_API Prepared(Prepared&& other) noexcept;
     KEL_API Prepared& operator=(Prepared&& other) noexcept;
     KEL_API ~Prepared();
-    /** Why the picture or an option cannot be used; empty otherwise. */
+    /** Why the picture or an option cannot be used, or the bytes of restored(); empty otherwise. */
     KEL_API const std::string& reason() const;
+    /**
+     * The bytes from which restored() makes the same again, for a file or another machine: about three for each pixel of the
+     * working picture, what a larger picture has above that, and 156 for each feature. Empty where there is a reason().
+     *
+     * All numbers are little-endian: "kelReady"; 32-bit integers: 1 for this form, width, height, how many times the picture was
+     * halved, the most features, how many there are; one byte a pixel, row by row, of the working picture and of every
+     * smoothed level with its border; the features as in Feature; the FNV-1a hash, by words of 64 bits (zeros fill the
+     * last one), of all that stands before it.
+     */
+    KEL_API std::vector<unsigned char> store() const;
+    /**
+     * What gave `size` bytes by store(), on any processor. It registers to the bit as that would. Bytes that are cut or
+     * changed, or of another form, give one with a reason(), and so does whatever else they hold.
+     */
+    KEL_API static Prepared restored(const void* bytes, size_t size);
 
 private:
     friend Result registerPictures(const Prepared& first, const Prepared& second, const Options& options);
     struct Body;
+    explicit Prepared(std::unique_ptr<Body> body);
     std::unique_ptr<Body> m_body;
 };
 

@@ -52,11 +52,15 @@ std::string whyUnusable(const kelImage_t* picture, const char* name) {
     default:
         return the + "has pixel type " + std::to_string(picture->type) + ", which cannot be registered";
     }
-    const std::string size = std::to_string(picture->width) + " x " + std::to_string(picture->height);
-    if (std::min(picture->width, picture->height) < kLeastSide)
+    return whyUnusable(picture->width, picture->height, name);
+}
+
+std::string whyUnusable(int width, int height, const char* name) {
+    const std::string the = std::string("the ") + name + " picture ";
+    const std::string size = std::to_string(width) + " x " + std::to_string(height);
+    if (std::min(width, height) < kLeastSide)
         return the + "is too small: " + size + " pixels, at least " + std::to_string(kLeastSide) + " either way are needed";
-    if (std::max(picture->width, picture->height) > kMostSide ||
-        static_cast<double>(picture->width) * picture->height > kMostPixels)
+    if (std::max(width, height) > kMostSide || static_cast<double>(width) * height > kMostPixels)
         return the + "is too large: " + size + " pixels";
     return std::string();
 }

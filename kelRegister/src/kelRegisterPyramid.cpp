@@ -12,68 +12,108 @@ namespace {
 constexpr int kSmallestLevel = 40; // pixels on the shorter side
 constexpr int kMostOctaves = 4;
 
-// The level of `image`; where `next` is not null, also the image for the one half as large, whose pixels are every second of
-// this.
-Level makeLevel(const Image& image, double scale, double offset, bool withCross, Image* next) {
-    const int width = image->width + 2 * kBorder, height = image->height + 2 * kBorder;
-    Level level{create(width, height, KEL_PIXEL_TYPE_U8G), Image(), scale, offset};
-    Image scratch = create(width, height, KEL_PIXEL_TYPE_U8G);
-    Image half;
-    if (next)
-        half = create((width + 1) / 2, (height + 1) / 2, KEL_PIXEL_TYPE_U8G);
+// Of a picture of which every second pixel is taken.
+int halved(int size) {
+    return (size + 1) / 2;
+}
+
+Level blankLevel(int width, int height, double scale, double offset) {
+    return {create(width + 2 * kBorder, height + 2 * kBorder, KEL_PIXEL_TYPE_U8G), Image(), scale, offset};
+}
+
+void addChain(std::vector<Level>& levels, int width, int height, double scale, double offset) {
+    for (int octave = 0; octave < kMostOctaves && std::min(width, height) >= kSmallestLevel; ++octave) {
+        levels.push_back(blankLevel(width, height, scale, offset));
+        width = halved(width);
+        height = halved(height);
+        scale *= 2;
+    }
+}
+
+// Both chains, blank, of an image of working size.
+void addChains(Pyramid& pyramid, int width, int height) {
+    const double scale = pyramid.workingScale, root = std::sqrt(2.0);
+    pyramid.firstWorking = pyramid.levels.size();
+    addChain(pyramid.levels, width, height, scale, 0);
+    // Pixel centres map to pixel centres at p * root + (root - 1) / 2; halving keeps even pixels, and so the offset.
+    if (pyramid.levels.size() > pyramid.firstWorking)
+        addChain(pyramid.levels, static_cast<int>(width / root), static_cast<int>(height / root), scale * root,
+                 scale * (root - 1) / 2);
+}
+
+// Fills a level from its image; returns that of the level half as large.
+Image fill(Level& level, const Image& image, bool withCross) {
+    const int width = level.smooth->width, height = level.smooth->height;
+    Image scratch = create(width, height, KEL_PIXEL_TYPE_U8G), half = create(halved(width), halved(height), KEL_PIXEL_TYPE_U8G);
     resizeKelImageEnborder(level.smooth.get(), image.get(), kBorder);
     applyKelFilterGaussian7X7_downsampling(level.smooth.get(), half.get(), level.smooth.get(), scratch.get());
     if (withCross) {
         level.cross = create(width, height, KEL_PIXEL_TYPE_S16G);
         applyKelFilterLaplacian3X3(level.cross.get(), level.smooth.get());
     }
-    if (next) {
-        *next = create(half->width - kBorder, half->height - kBorder, KEL_PIXEL_TYPE_U8G);
-        resizeKelImageDeborder(next->get(), half.get(), kBorder / 2);
-    }
-    return level;
+    Image next = create(half->width - kBorder, half->height - kBorder, KEL_PIXEL_TYPE_U8G);
+    resizeKelImageDeborder(next.get(), half.get(), kBorder / 2);
+    return next;
 }
 
-void addChain(std::vector<Level>& levels, Image image, double scale, double offset) {
-    for (int octave = 0; octave < kMostOctaves && std::min(image->width, image->height) >= kSmallestLevel; ++octave) {
-        Image next;
-        levels.push_back(makeLevel(image, scale, offset, true, &next));
-        image = std::move(next);
-        scale *= 2;
-    }
+// Fills the chain that begins with level i; returns where the next one begins.
+size_t fillChain(std::vector<Level>& levels, size_t i, Image image) {
+    do
+        image = fill(levels[i], image, true);
+    while (++i < levels.size() && levels[i].scale == 2 * levels[i - 1].scale);
+    return i;
 }
 
-// Both chains from an image of working size.
-void addChains(Pyramid& pyramid, Image image) {
-    const double scale = pyramid.workingScale, root = std::sqrt(2.0);
-    const int width = static_cast<int>(image->width / root), height = static_cast<int>(image->height / root);
-    pyramid.firstWorking = pyramid.levels.size();
-    addChain(pyramid.levels, std::move(image), scale, 0);
-    if (pyramid.levels.size() == pyramid.firstWorking)
+void fillChains(Pyramid& pyramid, Image image) {
+    std::vector<Level>& levels = pyramid.levels;
+    if (pyramid.firstWorking == levels.size())
         return;
-    Image between = create(width, height, KEL_PIXEL_TYPE_U8G);
-    const float r = static_cast<float>(root);
-    rotateKelImageHomography(between.get(), pyramid.levels[pyramid.firstWorking].smooth.get(), r, 0, kBorder, 0, r, kBorder, 0,
-                             0, 1);
-    // Pixel centres map to pixel centres at p * root + (root - 1) / 2; halving keeps even pixels, and so the offset.
-    addChain(pyramid.levels, std::move(between), scale * root, scale * (root - 1) / 2);
+    const size_t second = fillChain(levels, pyramid.firstWorking, std::move(image));
+    if (second == levels.size())
+        return;
+    Image between = create(levels[second].width(), levels[second].height(), KEL_PIXEL_TYPE_U8G);
+    const float r = static_cast<float>(std::sqrt(2.0));
+    rotateKelImageHomography(between.get(), levels[pyramid.firstWorking].smooth.get(), r, 0, kBorder, 0, r, kBorder, 0, 0, 1);
+    fillChain(levels, second, std::move(between));
 }
 
 } // namespace
 
-Pyramid makePyramid(Image grey, int workingSize) {
+bool canBeHalved(int width, int height, int times) {
+    for (; times > 0; --times) {
+        if (std::min(width, height) < 2 * kSmallestLevel)
+            return false;
+        width = halved(width);
+        height = halved(height);
+    }
+    return times == 0;
+}
+
+Pyramid blankPyramid(int width, int height, int halvings) {
     Pyramid pyramid;
-    pyramid.width = grey->width;
-    pyramid.height = grey->height;
-    pyramid.workingScale = 1;
-    while (std::max(grey->width, grey->height) > workingSize && std::min(grey->width, grey->height) >= 2 * kSmallestLevel) {
-        Image next;
-        pyramid.levels.push_back(makeLevel(grey, pyramid.workingScale, 0, false, &next));
-        grey = std::move(next);
+    pyramid.width = width;
+    pyramid.height = height;
+    for (int i = 0; i < halvings; ++i) {
+        pyramid.levels.push_back(blankLevel(width, height, pyramid.workingScale, 0));
+        width = halved(width);
+        height = halved(height);
         pyramid.workingScale *= 2;
     }
+    pyramid.working = create(width, height, KEL_PIXEL_TYPE_U8G);
+    addChains(pyramid, width, height);
+    return pyramid;
+}
+
+Pyramid makePyramid(Image grey, int workingSize) {
+    int halvings = 0;
+    for (int longer = std::max(grey->width, grey->height);
+         longer > workingSize && canBeHalved(grey->width, grey->height, halvings + 1); longer = halved(longer))
+        ++halvings;
+    Pyramid pyramid = blankPyramid(grey->width, grey->height, halvings);
+    for (int i = 0; i < halvings; ++i)
+        grey = fill(pyramid.levels[static_cast<size_t>(i)], grey, false);
     pyramid.working = grey.clone();
-    addChains(pyramid, std::move(grey));
+    fillChains(pyramid, std::move(grey));
     return pyramid;
 }
 
@@ -120,7 +160,8 @@ View makeView(const Pyramid& picture, int eighths) {
     }
     view.pyramid.width = static_cast<int>(image->width * scale);
     view.pyramid.height = static_cast<int>(image->height * scale);
-    addChains(view.pyramid, std::move(image));
+    addChains(view.pyramid, image->width, image->height);
+    fillChains(view.pyramid, std::move(image));
     return view;
 }
 

@@ -85,10 +85,15 @@ struct Pyramid {
 
 // Why a picture cannot be used, or nothing. `name` stands in the text.
 std::string whyUnusable(const kelImage_t* picture, const char* name);
+std::string whyUnusable(int width, int height, const char* name);
 // The picture in grey, U8G, spread over 0 .. 255; its padding repeats each row's last pixel.
 Image greyOf(const kelImage_t* picture);
 // The levels of greyOf()'s result, which it takes over.
 Pyramid makePyramid(Image grey, int workingSize);
+// What makePyramid() makes of a picture of this size that it halves so many times, with zeros for pixels.
+Pyramid blankPyramid(int width, int height, int halvings);
+// Whether it may be halved so many times.
+bool canBeHalved(int width, int height, int times);
 // The levels of the picture squeezed by 2 along a direction, and where its pixels lie in the picture.
 struct View {
     double direction; // radians
@@ -104,6 +109,20 @@ View makeView(const Pyramid& picture, int eighths);
 
 // At most `most` keypoints with their descriptions, in coordinates of the picture (of the view, where it is one).
 std::vector<Feature> findFeatures(const Pyramid& pyramid, int most);
+
+// A picture ready for registration, or why it is not.
+struct Ready {
+    std::string reason;
+    Pyramid pyramid; // without responses
+    std::vector<Feature> features;
+    int mostFeatures = 0;
+};
+
+// ---- kelRegisterStorage.cpp ----
+
+// The bytes of a picture, which has no reason; and back. What cannot be read has one.
+std::vector<unsigned char> store(const Ready& ready);
+Ready restored(const unsigned char* bytes, size_t size);
 
 struct Pair {
     Point first, second;

@@ -4,6 +4,6 @@ from typing import Any
 version: str
 
 class Prepared:
-    """A picture made ready for several registrations, by prepare()."""
+    """A picture made ready for several registrations, by prepare(). It can be pickled."""
 
 def __getattr__(name: str) -> Any: ...

@@ -94,7 +94,8 @@ def register(first: Union[Image, Prepared], second: Union[Image, Prepared], thre
 
 
 def prepare(image: Image, features: int = 1200, working_size: int = 1000) -> Prepared:
-    """A picture made ready once for register() with many others, which halves their time. The picture is not kept."""
+    """A picture made ready once for register() with many others, which halves their time. The picture is not kept; the result can be
+    pickled, for another process or machine."""
     return _kel.prepare(image, features, working_size)
 
 

@@ -15,10 +15,10 @@ import logging
 import os
 import sys
 import tempfile
-import threading
 import time
+import uuid
 import zlib
-from typing import Any, Dict, List, NamedTuple, Optional, Sequence, Tuple
+from typing import Any, Dict, List, NamedTuple, Optional, Sequence, Set, Tuple
 
 import numpy as np
 
@@ -41,26 +41,32 @@ class Settings(NamedTuple):
     threshold: float
     features: int
     working_size: int
-    memory: int  # bytes of pictures that a worker keeps
+    memory: int  # bytes of pictures that a worker is given to keep
 
 
 class Picture(NamedTuple):
-    """A picture as workers keep it: made ready once, with a small copy, or the reason why it is none."""
+    """A picture as workers keep it and hand it to each other: made ready once, with a small copy, or the reason why it is none."""
 
     prepared: Any  # kel.Prepared, or None
     small: Any
     scale: float  # of the small copy
     reason: str
     size: int  # bytes, about
+    made: str  # by which two that were made of the same file are told apart
+
+
+class Outcome(NamedTuple):
+    """What a task gives back."""
+
+    rows: List[Row]
+    worker: str
+    pictures: Dict[str, Tuple[int, str]]  # size and made of each
 
 
 # ---- What runs in a worker --------------------------------------------------------------------------------------------------
 
-_kept: "collections.OrderedDict[Tuple[str, int, int], Picture]" = collections.OrderedDict()  # the last used are the last
-_lock = threading.Lock()
-
-
-def _load(path: str, settings: Settings) -> Picture:
+def load_picture(path: str, settings: Settings) -> Picture:
+    made = uuid.uuid4().hex
     try:
         image = kel.read(path)
         prepared = kel.prepare(image, settings.features, settings.working_size)
@@ -72,25 +78,9 @@ def _load(path: str, settings: Settings) -> Picture:
         scale = min(1.0, THUMBNAIL / max(height, width))
         small = kel.resize(image, (max(1, round(width * scale)), max(1, round(height * scale))))
         worked = min(width * height, settings.working_size * settings.working_size)
-        return Picture(prepared, small, scale, "", 12 * worked + 400 * settings.features)
+        return Picture(prepared, small, scale, "", 2 * worked + 3 * width * height // 2 + 200 * settings.features, made)
     except Exception as error:  # whatever a file may lead to is a reason, and not the end of the run
-        return Picture(None, None, 1.0, f"{path}: {error or type(error).__name__}", 1000)
-
-
-def _picture(path: str, settings: Settings) -> Tuple[Picture, int]:
-    """The picture, and 1 where it had to be read: where it is not among those kept. The longest unused go where there are too many."""
-    key = (path, settings.features, settings.working_size)
-    with _lock:
-        if key in _kept:
-            _kept.move_to_end(key)
-            return _kept[key], 0
-    made = _load(path, settings)
-    with _lock:
-        _kept[key] = made
-        total = sum(picture.size for picture in _kept.values())
-        while total > settings.memory and len(_kept) > 2:
-            total -= _kept.popitem(last=False)[1].size
-    return made, 1
+        return Picture(None, None, 1.0, f"{path}: {error or type(error).__name__}", 1000, made)
 
 
 def _small(first: Picture, second: Picture, homography: Any) -> bytes:
@@ -113,14 +103,15 @@ def _small(first: Picture, second: Picture, homography: Any) -> bytes:
     return file.getvalue()
 
 
-def register_batch(pairs: Sequence[Pair], settings: Settings) -> Tuple[List[Row], int]:
-    """A row of results.csv and a small picture for each pair, and how many pictures were read for them."""
-    rows, read = [], 0
+def register_batch(pairs: Sequence[Pair], paths: Sequence[str], pictures: Sequence[Picture], settings: Settings) -> Outcome:
+    """A row of results.csv and a small picture for each pair, from the pictures of `paths`."""
+    from distributed import get_worker
+
+    of = dict(zip(paths, pictures))
+    rows = []
     for pair in pairs:
         start = time.perf_counter()
-        first, new_first = _picture(pair.first, settings)
-        second, new_second = _picture(pair.second, settings)
-        read += new_first + new_second
+        first, second = of[pair.first], of[pair.second]
         numbers, agreement, inliers, reason, shown = [""] * 9, "", "", first.reason or second.reason, b""
         if not reason:
             kel.seed(zlib.crc32(pair.id.encode()))  # the same result wherever and whenever it is computed
@@ -135,7 +126,7 @@ def register_batch(pairs: Sequence[Pair], settings: Settings) -> Tuple[List[Row]
             shown = _small(first, second, homography)
         milliseconds = f"{1000 * (time.perf_counter() - start):.1f}"
         rows.append(([pair.id, str(int(not reason)), *numbers, agreement, inliers, milliseconds, " ".join(reason.split())], shown))
-    return rows, read
+    return Outcome(rows, get_worker().address, {path: (picture.size, picture.made) for path, picture in of.items()})
 
 
 def _version() -> str:
@@ -306,7 +297,7 @@ def connect(arguments: argparse.Namespace, folder: str) -> Any:
 
 
 class Queues:
-    """Batches of pairs, a share for each worker: neighbours have pictures in common, which a worker then reads once."""
+    """Batches of pairs, a share for each worker: neighbours have pictures in common, which a worker then has already."""
 
     def __init__(self, batches: List[List[Pair]], workers: Sequence[str]) -> None:
         count = len(workers)
@@ -325,23 +316,88 @@ class Queues:
         next(iter(self.shares.values())).append(batch)
 
 
+class Pictures:
+    """Pictures in the workers' memory, each made by one task for all. Dask hands them to the workers whose pairs need them; where those
+    of a worker exceed settings.memory, the longest unused go from all workers, and one that is needed again is made again."""
+
+    def __init__(self, client: Any, pairs: Sequence[Pair], settings: Settings) -> None:
+        self.client, self.settings = client, settings
+        self.futures: "collections.OrderedDict[str, Any]" = collections.OrderedDict()  # the last used are the last
+        self.flying = collections.Counter()  # tasks that use it now
+        self.left = collections.Counter(path for pair in pairs for path in {pair.first, pair.second})
+        self.given: Dict[str, Set[str]] = {}  # what each worker has had
+        self.sizes: Dict[str, int] = {}
+        self.failed = collections.Counter()
+        self.made: Set[str] = set()
+
+    def take(self, batch: Sequence[Pair], worker: str) -> Tuple[List[str], List[Any]]:
+        """The pictures of a task that is about to go to a worker."""
+        paths = list(dict.fromkeys(path for pair in batch for path in (pair.first, pair.second)))
+        given = self.given.setdefault(worker, set())
+        given.update(paths)
+        for path in paths:
+            self.flying[path] += 1
+            if path not in self.futures:
+                self.futures[path] = self.client.submit(load_picture, path, self.settings, pure=False, workers=[worker],
+                                                        allow_other_workers=True)
+            self.futures.move_to_end(path)
+        self._shrink(given)
+        return paths, [self.futures[path] for path in paths]
+
+    def _shrink(self, given: Set[str]) -> None:
+        guess = max(self.sizes.values(), default=0)
+        total = sum(self.sizes.get(path, guess) for path in given)
+        for path in [path for path in self.futures if path in given]:
+            if total <= self.settings.memory:
+                break
+            if not self.flying[path]:
+                total -= self.sizes.get(path, guess)
+                self._drop(path)
+
+    def _drop(self, path: str) -> None:
+        del self.futures[path]  # Dask forgets what nobody has a future of
+        for given in self.given.values():
+            given.discard(path)
+
+    def landed(self, batch: Sequence[Pair], paths: Sequence[str], outcome: Optional[Outcome]) -> None:
+        """A task is over: its pairs are done, where there is an outcome."""
+        if outcome:
+            self.given.setdefault(outcome.worker, set()).update(paths)
+            for path, (size, made) in outcome.pictures.items():
+                self.sizes[path] = size
+                self.made.add(made)
+            self.left.subtract(path for pair in batch for path in {pair.first, pair.second})
+        for path in paths:
+            self.flying[path] -= 1
+            future = self.futures[path]
+            if not self.flying[path] and outcome and self.left[path] <= 0:
+                self._drop(path)
+            elif not self.flying[path] and future.status == "error" and self.failed[path] < 2:
+                self.failed[path] += 1  # it may have been beside what killed the worker
+                self._drop(path)
+
+
 def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, results: Results, bar: Bar) -> int:
-    """Batches of pairs to the workers, few enough at a time that little is in flight; rows as they come. How many pictures were read."""
+    """Batches of pairs to the workers, few enough at a time that little is in flight; rows as they come. How often pictures were read."""
     from concurrent.futures import CancelledError
 
     from distributed import KilledWorker, wait
 
     lost = Refused("the scheduler is gone; run the same again, and it goes on from here")
     queues = Queues([pairs[i:i + batch] for i in range(0, len(pairs), batch)], list(client.nthreads()))
-    flying: Dict[Any, Tuple[List[Pair], str]] = {}
-    found, read = sum(row[1] == "1" for row in results.rows), 0
+    pictures = Pictures(client, pairs, settings)
+    flying: Dict[Any, Tuple[List[Pair], List[str], str]] = {}
+    tried: "collections.Counter[str]" = collections.Counter()
+    found = sum(row[1] == "1" for row in results.rows)
     while queues or flying:
-        busy = collections.Counter(worker for _, worker in flying.values())
+        busy = collections.Counter(worker for _, _, worker in flying.values())
         for worker, threads in client.nthreads().items():
             while queues and busy[worker] < 2 * threads:
                 some = queues.take(worker)
-                future = client.submit(register_batch, some, settings, pure=False, workers=[worker], allow_other_workers=True)
-                flying[future] = some, worker
+                paths, theirs = pictures.take(some, worker)
+                future = client.submit(register_batch, some, paths, theirs, settings, pure=False, workers=[worker],
+                                       allow_other_workers=True)
+                flying[future] = some, paths, worker
                 busy[worker] += 1
         if not flying:
             print("no workers; waiting for some", file=sys.stderr)
@@ -353,17 +409,20 @@ def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, r
         except CancelledError:
             raise lost from None
         for future in done:
-            some, _ = flying.pop(future)
+            some, paths, _ = flying.pop(future)
             if future.status == "finished":
-                rows, new = future.result()
-                read += new
-            elif future.status == "error" and len(some) > 1:
-                for pair in some:
-                    queues.add([pair])  # which of them it is will show
-                continue
+                outcome = future.result()
+                pictures.landed(some, paths, outcome)
+                rows = outcome.rows
             elif future.status == "error":
+                pictures.landed(some, paths, None)
                 error = future.exception()
                 died = isinstance(error, KilledWorker)
+                tried.update(pair.id for pair in some)
+                if len(some) > 1 or (died and tried[some[0].id] < 3):
+                    for pair in some:
+                        queues.add([pair])  # which of them it is will show
+                    continue
                 reason = "the workers that tried it died" if died else f"{type(error).__name__}: {error}"
                 rows = [([some[0].id, "0", *[""] * 9, "", "", "", " ".join(reason.split())], b"")]
             else:
@@ -374,7 +433,7 @@ def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, r
         if client.status not in ("running", "connecting"):
             raise lost
     bar.show(len(results.rows), found, end=True)
-    return read
+    return len(pictures.made)
 
 
 def run(pairs: List[Pair], settings: Settings, arguments: argparse.Namespace, results: Results) -> None:
@@ -427,7 +486,7 @@ def main(words: Optional[Sequence[str]] = None) -> int:
     parser.add_argument("--scheduler", metavar="tcp://...", help="a Dask cluster that is there; its workers see the same folders")
     parser.add_argument("--workers", type=whole(1, 1000), default=len(os.sched_getaffinity(0)), help="processes here (all cores)")
     parser.add_argument("--batch", type=whole(1, 1000), default=8, help="pairs a task (8)")
-    parser.add_argument("--memory", type=whole(1, 1000000), default=500, help="MB of pictures that a worker keeps ready (500)")
+    parser.add_argument("--memory", type=whole(1, 1000000), default=500, help="MB of pictures that a worker has ready at a time (500)")
     parser.add_argument("--threshold", type=distance, default=3.0, help="distance at which matches fit, pixels (3)")
     parser.add_argument("--features", type=whole(50, 5000), default=1200, help="most keypoints a picture (1200)")
     parser.add_argument("--working-size", type=whole(200, 8000), default=1000, help="pictures are halved to this (1000)")

@@ -141,7 +141,27 @@ void addRegistration(py::module_& module) {
     PYBIND11_NUMPY_DTYPE(Pair, first, second, x1, y1, x2, y2, inlier);
     module.attr("FEATURE") = py::dtype::of<Feature>();
     module.attr("MATCH") = py::dtype::of<Pair>();
-    py::class_<Prepared>(module, "Prepared", "A picture made ready for several registrations, by prepare().");
+    py::class_<Prepared>(module, "Prepared", "A picture made ready for several registrations, by prepare(). It can be pickled.")
+        .def(py::pickle(
+            [](const Prepared& prepared) {
+                std::vector<unsigned char> bytes;
+                {
+                    const py::gil_scoped_release free;
+                    bytes = prepared.store();
+                }
+                return py::bytes(reinterpret_cast<const char*>(bytes.data()), bytes.size());
+            },
+            [](const py::bytes& bytes) {
+                const std::string_view view = bytes;
+                std::unique_ptr<Prepared> made;
+                {
+                    const py::gil_scoped_release free;
+                    made = std::make_unique<Prepared>(Prepared::restored(view.data(), view.size()));
+                }
+                if (!made->reason().empty())
+                    throw py::value_error("state: " + made->reason());
+                return made;
+            }));
     module.def("prepare", [](const py::object& image, const py::object& mostFeatures, const py::object& workingSize) {
         std::unique_ptr<Prepared> made = prepare(image, "image", options(py::int_(3), mostFeatures, workingSize, true));
         if (!made->reason().empty())

@@ -1,6 +1,7 @@
 """Fits, registration and files."""
 
 import os
+import pickle
 import subprocess
 import sys
 import threading
@@ -80,9 +81,12 @@ def test_register():
     kel.seed(5)
     expected = kel.register(first, second).homography
     colour = np.repeat(np.repeat(second, 2, 1)[:, ::2, None], 3, 2)
-    for a, b in ((kel.prepare(first), kel.prepare(second)), (first, kel.prepare(second)), (kel.prepare(first), second), (first, colour)):
+    ready = pickle.loads(pickle.dumps(kel.prepare(first)))
+    for a, b in ((ready, kel.prepare(second)), (first, kel.prepare(second)), (kel.prepare(first), second), (first, colour)):
         kel.seed(5)
         np.testing.assert_array_equal(kel.register(a, b).homography, expected)
+    with pytest.raises(ValueError, match="state: the bytes are no prepared picture"):
+        kel.Prepared.__new__(kel.Prepared).__setstate__(b"kelReady")
     features = [kel.find_features(picture) for picture in (first, second)]
     matches = kel.match_features(*features)
     assert len(matches) > 20 and features[0]["descriptor"].shape[1] == 128

@@ -7,6 +7,7 @@
 #include <gtest/gtest.h>
 #include <kel/kelRegister.h>
 #include <limits>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -140,6 +141,92 @@ TEST(Register, PreparedPicturesGiveTheSameBits) {
     EXPECT_TRUE(second.reason().empty());
     EXPECT_EQ(registerPictures(moved, small).reason, small.reason());
     EXPECT_EQ(small.reason(), "the given picture is too small: 7 x 7 pixels, at least 40 either way are needed");
+}
+
+uint64_t hashOf(const std::vector<unsigned char>& bytes, size_t size) {
+    uint64_t hash = 14695981039346656037u;
+    for (size_t i = 0; i < size; i += 8) {
+        uint64_t word = 0;
+        for (size_t k = 0; k < 8 && i + k < size; ++k)
+            word |= uint64_t(bytes[i + k]) << (8 * k);
+        hash = (hash ^ word) * 1099511628211u;
+    }
+    return hash;
+}
+
+std::string reasonOf(const std::vector<unsigned char>& bytes, size_t size) {
+    return kelRegister::Prepared::restored(
+               std::vector<unsigned char>(bytes.begin(), bytes.begin() + static_cast<ptrdiff_t>(size)).data(), size)
+        .reason();
+}
+
+TEST(Register, PreparedPicturesComeBackFromTheirBytes) {
+    using kelRegister::Prepared;
+    Options small;
+    small.workingSize = 200;
+    Plane H;
+    for (const Options& options : {Options(), small}) { // with finer levels than the working picture and without
+        const Image view = warped(scene().get(), {1.3, 40, 30, 0.9}, 1000, H);
+        const Prepared first(scene().get(), options), second(view.get(), options);
+        const std::vector<unsigned char> bytes = first.store(), others = second.store();
+        const Prepared again = Prepared::restored(bytes.data(), bytes.size());
+        ASSERT_EQ(again.reason(), "");
+        EXPECT_EQ(again.store(), bytes);
+        std::srand(3);
+        const Result expected = registerPictures(first, second, options);
+        std::srand(3);
+        const Result r = registerPictures(again, Prepared::restored(others.data(), others.size()), options);
+        ASSERT_TRUE(r.found && expected.found) << r.reason;
+        EXPECT_EQ(std::memcmp(r.H.m_Data, expected.H.m_Data, 9 * sizeof(float)), 0);
+        EXPECT_EQ(r.agreeing, expected.agreeing);
+        EXPECT_EQ(r.expectedError, expected.expectedError);
+    }
+    Image tiny(7, 7, KEL_PIXEL_TYPE_U8G);
+    EXPECT_TRUE(Prepared(tiny.get()).store().empty());
+}
+
+TEST(Register, BytesThatAreNoPreparedPictureAreRefused) {
+    using kelRegister::Prepared;
+    const Image picture = drawnScene(90, 60, 4);
+    const std::vector<unsigned char> bytes = Prepared(picture.get()).store();
+    const std::string changed = "the prepared picture is cut or was changed";
+    EXPECT_EQ(std::string(bytes.begin(), bytes.begin() + 8), "kelReady");
+    EXPECT_EQ(std::vector<int>(bytes.begin() + 8, bytes.begin() + 20),
+              (std::vector<int>{1, 0, 0, 0, 90, 0, 0, 0, 60, 0, 0, 0}));
+    for (size_t size = 0; size < bytes.size(); size += size < 64 ? 1 : 997)
+        EXPECT_EQ(reasonOf(bytes, size), size < 32 ? "the bytes are no prepared picture" : changed) << size;
+    std::vector<unsigned char> other = bytes;
+    other.push_back(0);
+    EXPECT_EQ(reasonOf(other, other.size()), changed);
+    for (size_t i = 0; i < bytes.size(); i += i < 40 ? 1 : 499) {
+        other = bytes;
+        other[i] ^= 1;
+        EXPECT_EQ(reasonOf(other, other.size()), i < 8    ? "the bytes are no prepared picture"
+                                                 : i == 8 ? "the prepared picture is of form 0, this library reads form 1"
+                                                 : i < 12 ? "the prepared picture is of form " +
+                                                                std::to_string(1 + (1 << 8 * (i - 8))) +
+                                                                ", this library reads form 1"
+                                                          : changed);
+    }
+    // With a hash that fits: sizes and places that do not; other numbers are as good as any and lead nowhere wrong.
+    std::mt19937 random(5);
+    std::srand(1);
+    for (int round = 0; round < 300; ++round) {
+        other = bytes;
+        const size_t tail = 8 + 156 * 4; // the last four features
+        const size_t place = round % 3 == 0   ? 12 + random() % 20
+                             : round % 3 == 1 ? other.size() - tail + random() % (tail - 8)
+                                              : 32 + random() % (other.size() - 40);
+        other[place] = static_cast<unsigned char>(random());
+        const uint64_t hash = hashOf(other, other.size() - 8);
+        for (size_t k = 0; k < 8; ++k)
+            other[other.size() - 8 + k] = static_cast<unsigned char>(hash >> 8 * k);
+        const Prepared made = Prepared::restored(other.data(), other.size());
+        if (!made.reason().empty())
+            EXPECT_EQ(made.reason(), "the prepared picture contradicts itself");
+        else
+            registerPictures(made, made);
+    }
 }
 
 // Grey values alone count, and padding does not.
