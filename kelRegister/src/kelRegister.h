@@ -129,8 +129,8 @@ public:
      */
     KEL_API std::vector<unsigned char> store() const;
     /**
-     * What gave `size` bytes by store(), on any processor. It registers to the bit as that would. Bytes that are cut or
-     * changed, or of another form, give one with a reason(), and so does whatever else they hold.
+     * What store() gave these `size` bytes of, on any processor; it registers to the bit as that does. Bytes that are cut,
+     * changed, of another form or no such bytes at all make one with a reason().
      */
     KEL_API static Prepared restored(const void* bytes, size_t size);
 

@@ -52,7 +52,7 @@ class Picture(NamedTuple):
     scale: float  # of the small copy
     reason: str
     size: int  # bytes, about
-    made: str  # by which two that were made of the same file are told apart
+    made: Tuple[str, str]  # by which worker, and a mark to tell apart what was made of the same file
 
 
 class Outcome(NamedTuple):
@@ -60,13 +60,15 @@ class Outcome(NamedTuple):
 
     rows: List[Row]
     worker: str
-    pictures: Dict[str, Tuple[int, str]]  # size and made of each
+    pictures: Dict[str, Tuple[int, Tuple[str, str]]]  # size and made of each
 
 
 # ---- What runs in a worker --------------------------------------------------------------------------------------------------
 
 def load_picture(path: str, settings: Settings) -> Picture:
-    made = uuid.uuid4().hex
+    from distributed import get_worker
+
+    made = get_worker().address, uuid.uuid4().hex
     try:
         image = kel.read(path)
         prepared = kel.prepare(image, settings.features, settings.working_size)
@@ -328,7 +330,7 @@ class Pictures:
         self.given: Dict[str, Set[str]] = {}  # what each worker has had
         self.sizes: Dict[str, int] = {}
         self.failed = collections.Counter()
-        self.made: Set[str] = set()
+        self.made: Set[Tuple[str, str]] = set()
 
     def take(self, batch: Sequence[Pair], worker: str) -> Tuple[List[str], List[Any]]:
         """The pictures of a task that is about to go to a worker."""
@@ -338,16 +340,16 @@ class Pictures:
         for path in paths:
             self.flying[path] += 1
             if path not in self.futures:
-                self.futures[path] = self.client.submit(load_picture, path, self.settings, pure=False, workers=[worker],
-                                                        allow_other_workers=True)
+                self.futures[path] = self.client.submit(load_picture, path, self.settings, pure=False)
             self.futures.move_to_end(path)
         self._shrink(given)
         return paths, [self.futures[path] for path in paths]
 
     def _shrink(self, given: Set[str]) -> None:
         guess = max(self.sizes.values(), default=0)
-        total = sum(self.sizes.get(path, guess) for path in given)
-        for path in [path for path in self.futures if path in given]:
+        held = [path for path in self.futures if path in given]
+        total = sum(self.sizes.get(path, guess) for path in held)
+        for path in held:
             if total <= self.settings.memory:
                 break
             if not self.flying[path]:
@@ -359,22 +361,38 @@ class Pictures:
         for given in self.given.values():
             given.discard(path)
 
-    def landed(self, batch: Sequence[Pair], paths: Sequence[str], outcome: Optional[Outcome]) -> None:
-        """A task is over: its pairs are done, where there is an outcome."""
+    def there(self, paths: Sequence[str]) -> bool:
+        return all(path not in self.futures or self.futures[path].status != "pending" for path in paths)
+
+    def landed(self, batch: Sequence[Pair], paths: Sequence[str], outcome: Optional[Outcome]) -> bool:
+        """A task is over: its pairs are done, where there is an outcome. Whether a picture failed that is worth another try."""
+        again = False
         if outcome:
             self.given.setdefault(outcome.worker, set()).update(paths)
             for path, (size, made) in outcome.pictures.items():
                 self.sizes[path] = size
                 self.made.add(made)
+                self.given.setdefault(made[0], set()).add(path)
             self.left.subtract(path for pair in batch for path in {pair.first, pair.second})
         for path in paths:
             self.flying[path] -= 1
-            future = self.futures[path]
-            if not self.flying[path] and outcome and self.left[path] <= 0:
-                self._drop(path)
-            elif not self.flying[path] and future.status == "error" and self.failed[path] < 2:
+            future = self.futures.get(path)
+            if future and future.status == "error" and self.failed[path] < 1:
                 self.failed[path] += 1  # it may have been beside what killed the worker
                 self._drop(path)
+                again = True
+            elif future and outcome and not self.flying[path] and self.left[path] <= 0:
+                self._drop(path)
+        return again
+
+
+def orphans(client: Any, flying: Dict[Any, Tuple[List[Pair], List[str], str]], pictures: Pictures) -> List[Any]:
+    """Tasks that Dask leaves alone: meant for a worker that died when there was no other."""
+    workers = client.nthreads()
+    alone = [future for future, (_, paths, worker) in flying.items()
+             if worker not in workers and future.status == "pending" and pictures.there(paths)]
+    working = {key for keys in client.processing().values() for key in keys} if alone and workers else set()
+    return [future for future in alone if workers and future.key not in working and future.status == "pending"]
 
 
 def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, results: Results, bar: Bar) -> int:
@@ -387,8 +405,8 @@ def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, r
     queues = Queues([pairs[i:i + batch] for i in range(0, len(pairs), batch)], list(client.nthreads()))
     pictures = Pictures(client, pairs, settings)
     flying: Dict[Any, Tuple[List[Pair], List[str], str]] = {}
-    tried: "collections.Counter[str]" = collections.Counter()
-    found = sum(row[1] == "1" for row in results.rows)
+    deaths: "collections.Counter[str]" = collections.Counter()
+    found, seen = sum(row[1] == "1" for row in results.rows), time.monotonic()
     while queues or flying:
         busy = collections.Counter(worker for _, _, worker in flying.values())
         for worker, threads in client.nthreads().items():
@@ -399,30 +417,43 @@ def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, r
                                        allow_other_workers=True)
                 flying[future] = some, paths, worker
                 busy[worker] += 1
-        if not flying:
+        if client.nthreads():
+            seen = time.monotonic()
+        elif time.monotonic() > seen + 20:
             print("no workers; waiting for some", file=sys.stderr)
-            time.sleep(10)
+            seen = time.monotonic()
+            if client.cluster is not None:  # ours; one that was killed while it started may be left at that
+                count = max(1, len(client.cluster.worker_spec))
+                client.cluster.scale(0)
+                client.cluster.scale(count)
+        if not flying:
+            time.sleep(1)
         try:
             done = wait(list(flying), timeout=5, return_when="FIRST_COMPLETED").done if flying else set()
         except TimeoutError:
             done = set()
         except CancelledError:
             raise lost from None
-        for future in done:
+        for future in [*done, *orphans(client, flying, pictures)]:
+            if future in done and future.status in ("pending", "lost"):
+                continue  # what it gave went with its worker: Dask does it again
             some, paths, _ = flying.pop(future)
             if future.status == "finished":
                 outcome = future.result()
                 pictures.landed(some, paths, outcome)
                 rows = outcome.rows
-            elif future.status == "error":
-                pictures.landed(some, paths, None)
-                error = future.exception()
-                died = isinstance(error, KilledWorker)
-                tried.update(pair.id for pair in some)
-                if len(some) > 1 or (died and tried[some[0].id] < 3):
+            elif future.status in ("pending", "error"):
+                error = future.exception() if future.status == "error" else None
+                future.cancel()
+                again = pictures.landed(some, paths, None)
+                if error is None or isinstance(error, KilledWorker):
+                    deaths.update({pair.id: 2 if error else 1 for pair in some})
+                    again = again or deaths[some[0].id] < 4  # another pair may have killed them
+                if again or len(some) > 1:
                     for pair in some:
                         queues.add([pair])  # which of them it is will show
                     continue
+                died = error is None or isinstance(error, KilledWorker)
                 reason = "the workers that tried it died" if died else f"{type(error).__name__}: {error}"
                 rows = [([some[0].id, "0", *[""] * 9, "", "", "", " ".join(reason.split())], b"")]
             else:
