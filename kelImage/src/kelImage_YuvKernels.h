@@ -70,12 +70,12 @@ template <class V> V inOrder(V words) {
 
 // ---- The truncated channels in integers
 //
-// Where the thread rounds to nearest, the truncated sums are the true ones, floor(e / 1000) with e = 1164 (Y - 16) + 1793 V' and
-// the like, limited to 0 .. 255: of red and blue always, of green but for 479 of those colours whose e / 1000 is whole. In units
-// of 2^-16 the weights below are whole numbers, of which a byte and a word are factors. Their sums for green are 0 to 126 too
-// large, so that the lower words of those that are whole, or seem to be, are below kNearWhole: those go through floats. Sums for
-// red and blue are off by less than what parts the values of e / 1000, 65.5, wherever they are not limited, and never too small
-// where it is whole.
+// Where the thread rounds to nearest or up, the truncated sums are the true ones, floor(e / 1000) with e = 1164 (Y - 16) + 1793 V'
+// and the like, limited to 0 .. 255: of red and blue always, of green but for some hundreds of those colours whose e / 1000 is
+// whole. In units of 2^-16 the weights below are whole numbers, of which a byte and a word are factors. Their sums for green are 0
+// to 126 too large, so that the lower words of those that are whole, or seem to be, are below kNearWhole: those go through floats.
+// Sums for red and blue are off by less than what parts the values of e / 1000, 65.5, wherever they are not limited, and never too
+// small where it is whole.
 
 constexpr Sixteen bytesOfPairs(int u, int first, int v, int second) {
     Sixteen bytes = {};
@@ -141,11 +141,11 @@ struct ByFloats {
     }
 };
 
-inline bool roundsToNearest() {
-    volatile float half = 0.5f; // which no compiler rounds beforehand
-    int32_t halves[4];          // 0, 0.5, 1 and 1.5
-    store(halves, rounded(floatsOf(Lanes1::ascendingLongs()) * Lanes1::floats(half)));
-    return halves[1] == 0 && halves[3] == 2;
+inline bool roundsToNearestOrUp() {
+    volatile float x = 1.5f; // which no compiler rounds beforehand
+    int32_t longs[4];
+    store(longs, rounded(Lanes1::floats(x)));
+    return longs[0] == 2;
 }
 
 // Where the bytes of channel c go in three vectors that hold its pixels by threes. The places of a channel in the three never
@@ -184,7 +184,7 @@ template <bool blueFirst, class Arithmetic> void truncatedThree(uint8_t* d, cons
     });
 }
 template <bool blueFirst> void yuvToThree(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
-    (roundsToNearest() ? truncatedThree<blueFirst, ByIntegers> : truncatedThree<blueFirst, ByFloats>)(d, s, pixels);
+    (roundsToNearestOrUp() ? truncatedThree<blueFirst, ByIntegers> : truncatedThree<blueFirst, ByFloats>)(d, s, pixels);
 }
 
 template <bool blueFirst> void yuvToFour(uint8_t* d, const uint8_t* s, ptrdiff_t pixels) {
