@@ -14,7 +14,6 @@
 #include <unistd.h>
 
 #include "common/Scene.h"
-#include "common/Warp.h"
 
 namespace {
 
@@ -205,32 +204,6 @@ TEST_F(Programs, RegisterReadsEveryFormat) {
         EXPECT_LT(meanError(homographyIn(result.out), scene.H, 640, 480), 0.7) << name;
     }
     EXPECT_TRUE(fs::exists(path("pictures/mosaic.png")));
-}
-
-TEST_F(Programs, RegisterBearsTurnsScalesAndTilts) {
-    const Scene scene = renderScene(5);
-    writePicture(path("a.png"), scene.first);
-    kelMat centre(3, 3, true), turn, change(3, 3, true);
-    centre.setDataIdentity(1);
-    centre[0][2] = 320;
-    centre[1][2] = 240;
-    const struct {
-        float degrees, scale, perspective;
-    } views[] = {{90, 1, 0}, {170, 1, 0}, {0, 2.2f, 0}, {30, 0.45f, 0}, {10, 1, 1e-3f}};
-    for (const auto& view : views) {
-        turn.setDataRotationMatrix_Z_3x3(view.degrees);
-        change.setDataIdentity(view.scale);
-        change[2][2] = 1;
-        change[2][0] = view.perspective;
-        kelMat truth = centre * change * turn * centre.getInversedMatrix();
-        writePicture(path("b.png"), warpPicture(scene.first, truth, {640, 480}));
-        const Outcome result = run("register", "a.png b.png");
-        EXPECT_EQ(result.status, 0) << view.degrees << " " << view.scale << " " << view.perspective << result.err;
-        if (result.status == 0) {
-            EXPECT_LT(meanError(homographyIn(result.out), truth, 640, 480), 1.5)
-                << view.degrees << " " << view.scale << " " << view.perspective;
-        }
-    }
 }
 
 TEST_F(Programs, RegisterSaysWhereThereIsNoHomography) {

@@ -1,13 +1,11 @@
-// Gaussian 5x5 and 7x7: every byte of destination, half and scratch image beside the plain passes.
+// Gaussian 5x5 and 7x7: values worked out by hand, and where they stop.
 #include <gtest/gtest.h>
 
-#include "FilterReference.h"
 #include "GuardedImage.h"
 #include "Stops.h"
 
 using kel_test::Bytes;
 using kel_test::Fill;
-using kel_test::Guard;
 using kel_test::Image;
 
 namespace {
@@ -16,85 +14,15 @@ using Smooth = void (*)(kelImage_t*, kelImage_t*, kelImage_t*, kelImage_t*);
 
 struct Filter {
     const char* name;
-    Smooth smooth, reference;
+    Smooth smooth;
     int tmpType;
 };
 const Filter kFilters[] = {
-    {"5x5", applyKelFilterGaussian5X5_downsampling, kel_ref::gaussian5x5, KEL_PIXEL_TYPE_S16G},
-    {"7x7", applyKelFilterGaussianSSE7X7_downsampling, kel_ref::gaussian7x7, KEL_PIXEL_TYPE_U8G},
+    {"5x5", applyKelFilterGaussian5X5_downsampling, KEL_PIXEL_TYPE_S16G},
+    {"7x7", applyKelFilterGaussianSSE7X7_downsampling, KEL_PIXEL_TYPE_U8G},
 };
-
-enum class Half { None, Tight, Padded };
-
-// Where an image and its scratch image lie, and what else is asked of a call.
-struct Setting {
-    int width, height;
-    Guard guard = Guard::Behind;
-    Fill fill = Fill::Random;
-    Half half = Half::None;
-    bool inPlace = false;
-    int tmpWidth = 0, tmpHeight = 0; // more than the source's
-    size_t sourceExtra = 0;          // bytes that a larger scratch image makes the filter read
-};
-
-// Both filters on images of one setting, and what the plain passes leave in images of the same contents.
-class Scene {
-public:
-    Scene(const Setting& s, int tmpType)
-        : m_inPlace(s.inPlace), m_src(s.width, s.height, KEL_PIXEL_TYPE_U8G, s.guard, s.sourceExtra),
-          m_dst(s.width, s.height, KEL_PIXEL_TYPE_U8G, s.guard),
-          m_half((s.width + 1) / 2 + (s.half == Half::Padded ? 16 : 0), (s.height + 1) / 2, KEL_PIXEL_TYPE_U8G, s.guard),
-          m_tmp(s.width + s.tmpWidth, s.height + s.tmpHeight, tmpType, s.guard), m_withHalf(s.half != Half::None) {
-        m_src.fill(s.fill, 5);
-    }
-    void apply(Smooth smooth) const {
-        smooth(m_inPlace ? m_src.get() : m_dst.get(), m_withHalf ? m_half.get() : nullptr, m_src.get(), m_tmp.get());
-    }
-    testing::AssertionResult equals(const Scene& other) const {
-        for (const Image Scene::*image : {&Scene::m_src, &Scene::m_dst, &Scene::m_half, &Scene::m_tmp}) {
-            testing::AssertionResult result = holds(this->*image, (other.*image).bytes());
-            if (!result)
-                return result << (image == &Scene::m_tmp    ? " (scratch)"
-                                  : image == &Scene::m_half ? " (half)"
-                                                            : "")
-                              << (m_inPlace ? " in place" : "");
-        }
-        return testing::AssertionSuccess();
-    }
-
-private:
-    bool m_inPlace;
-    Image m_src, m_dst, m_half, m_tmp;
-    bool m_withHalf;
-};
-
-bool check(const Setting& setting) {
-    for (const Filter& filter : kFilters) {
-        const Scene actual(setting, filter.tmpType), expected(setting, filter.tmpType);
-        actual.apply(filter.smooth);
-        expected.apply(filter.reference);
-        const testing::AssertionResult same = actual.equals(expected);
-        EXPECT_TRUE(same) << filter.name << ", fill " << static_cast<int>(setting.fill);
-        if (!same)
-            return false;
-    }
-    return true;
-}
 
 } // namespace
-
-// 7x7 goes by the scratch image's extent and reads the source's memory as far as that makes it.
-TEST(Gaussian, TakesALargerScratchImage) {
-    for (int width : {10, 16, 17, 24, 25, 32, 40})
-        for (int height : {3, 6, 7, 12})
-            for (int wider : {0, 1, 7, 8, 16, 23})
-                for (int higher : {0, 1, 5})
-                    for (bool inPlace : {false, true}) {
-                        Setting setting{width, height, Guard::Behind, Fill::Random, Half::Padded, inPlace, wider, higher};
-                        setting.sourceExtra = 6 * 64 + 64;
-                        ASSERT_TRUE(check(setting));
-                    }
-}
 
 TEST(Gaussian, KeepsAConstantWhereItComputesAndItsOwnBorderElsewhere) {
     struct {

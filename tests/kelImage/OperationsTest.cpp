@@ -79,6 +79,22 @@ TEST(ImageOperations, EqualTheirReferencesOnEveryFillAndParameter) {
     });
 }
 
+// 7x7 goes by the scratch image's extent and reads the source's memory as far as that makes it.
+TEST(ImageOperations, TakeALargerScratchImage) {
+    forEveryOperation([](const ImageOperation& o) {
+        for (int width : {10, 16, 17, 24, 25, 32, 40})
+            for (int height : {3, 6, 7, 12})
+                for (int wider : {0, 1, 7, 8, 16, 23})
+                    for (int higher : {0, 1, 5})
+                        if (o.tmp != kNoType) {
+                            Setting setting = any(o, {width, height});
+                            setting.scratch = {wider, higher};
+                            setting.spare = 6 * 64 + 64;
+                            ASSERT_TRUE(agrees(o, setting));
+                        }
+    });
+}
+
 TEST(ImageOperations, GoByTheDestinationsSizeWhereTheyCheckNone) {
     forEveryOperation([](const ImageOperation& o) {
         for (Size dst : {Size{1, 4}, Size{15, 2}, Size{20, 9}, Size{33, 41}, Size{70, 40}}) {

@@ -178,11 +178,6 @@ TEST(Inverse, OfEverySize) {
             kel_ref::inverse(truth(A), expected);
             const double condition = norm(truth(A)) * norm(expected);
             EXPECT_LT(distance(truth(R), expected), 2 * kEps * condition * norm(expected)) << n;
-            if (n > 3) {
-                Reference plain;
-                kel_ref::inverse(reference(A), plain);
-                EXPECT_TRUE(same(R, plain));
-            }
         }
 }
 

@@ -4,7 +4,7 @@
 #include <fstream>
 #include <functional>
 
-#include "EstimatorReference.h"
+#include "Correspondences.h"
 #include "MatSupport.h"
 #include "Memory.h"
 #include "Stops.h"
@@ -12,64 +12,24 @@
 
 namespace {
 
+using kel_test::addPairs;
+using kel_test::pairs;
+using kel_test::Plane;
 using kel_test::same;
+using kel_test::Space;
+using kel_test::uniform;
 
-float uniform(std::mt19937& random, float lo, float hi) {
-    return std::uniform_real_distribution<float>(lo, hi)(random);
-}
+// Tests of both kinds of sets.
+template <class Kind> class Correspondences : public testing::Test {};
+template <class Kind> class LeastSquares : public testing::Test {};
+template <class Kind> class RansacOf : public testing::Test {};
+using Kinds = testing::Types<Plane, Space>;
+TYPED_TEST_SUITE(Correspondences, Kinds, );
+TYPED_TEST_SUITE(LeastSquares, Kinds, );
+TYPED_TEST_SUITE(RansacOf, Kinds, );
 
-kelMat homography(std::mt19937& random) {
-    kelMat H(3, 3, true);
-    H.setDataIdentity(1);
-    H[0][0] = uniform(random, 0.6f, 1.6f);
-    H[0][1] = uniform(random, -0.3f, 0.3f);
-    H[0][2] = uniform(random, -80, 80);
-    H[1][0] = uniform(random, -0.3f, 0.3f);
-    H[1][1] = uniform(random, 0.6f, 1.6f);
-    H[1][2] = uniform(random, -80, 80);
-    H[2][0] = uniform(random, -2e-4f, 2e-4f);
-    H[2][1] = uniform(random, -2e-4f, 2e-4f);
-    return H;
-}
-
-void addPairs(kelMatCorrespH& set, kelMat H, int n, float noise, float outliers, std::mt19937& random) {
-    for (int i = 0; i < n; ++i) {
-        const float x = uniform(random, 0, 640), y = uniform(random, 0, 480);
-        float u, v;
-        H.cvtPoint(x, y, &u, &v);
-        if (uniform(random, 0, 1) < outliers)
-            set.add(x, y, uniform(random, 0, 640), uniform(random, 0, 480));
-        else
-            set.add(x, y, u + uniform(random, -noise, noise), v + uniform(random, -noise, noise));
-    }
-}
-
-kelMat projection(std::mt19937& random) {
-    kelMatGeneratorP generator;
-    srand(random());
-    generator.setMatView(uniform(random, 500, 1000));
-    generator.setMatViewShift(320, 240);
-    generator.setMatObjectRandom(-40, 40, -40, 40, -180, 180, -200, 200, -200, 200, 2500, 3500);
-    kelMat P;
-    generator.getMat(P);
-    P.setDataUnitize();
-    return P;
-}
-
-void addPairs(kelMatCorrespP& set, kelMat P, int n, float noise, float outliers, std::mt19937& random) {
-    for (int i = 0; i < n; ++i) {
-        const float X = uniform(random, -500, 500), Y = uniform(random, -500, 500), Z = uniform(random, -500, 500);
-        float u, v;
-        P.cvtPoint(X, Y, Z, &u, &v);
-        if (uniform(random, 0, 1) < outliers)
-            set.add(X, Y, Z, uniform(random, 0, 640), uniform(random, 0, 480));
-        else
-            set.add(X, Y, Z, u + uniform(random, -noise, noise), v + uniform(random, -noise, noise));
-    }
-}
-
-// Largest distance between the images of points under two homographies.
-float distanceOf(kelMat A, kelMat B) {
+// Largest distance between the images of points under two transforms.
+float distanceOf(kelMat A, kelMat B, Plane = {}) {
     float worst = 0;
     for (float x : {0.f, 320.f, 640.f})
         for (float y : {0.f, 240.f, 480.f}) {
@@ -80,86 +40,66 @@ float distanceOf(kelMat A, kelMat B) {
         }
     return worst;
 }
-
-float distanceOfProjections(kelMat A, kelMat B) {
+float distanceOf(kelMat A, kelMat B, Space) {
     float worst = 0;
-    for (float X : {-500.f, 500.f})
-        for (float Y : {-500.f, 500.f})
-            for (float Z : {-500.f, 500.f}) {
-                float u, v, s, t;
-                A.cvtPoint(X, Y, Z, &u, &v);
-                B.cvtPoint(X, Y, Z, &s, &t);
-                worst = std::max(worst, std::hypot(u - s, v - t));
-            }
+    for (int corner = 0; corner < 8; ++corner) {
+        const float X = corner & 1 ? 500.f : -500.f, Y = corner & 2 ? 500.f : -500.f, Z = corner & 4 ? 500.f : -500.f;
+        float u, v, s, t;
+        A.cvtPoint(X, Y, Z, &u, &v);
+        B.cvtPoint(X, Y, Z, &s, &t);
+        worst = std::max(worst, std::hypot(u - s, v - t));
+    }
     return worst;
 }
 
 } // namespace
 
-TEST(Correspondences, StopGrowingSilentlyAtTheirMost) {
-    kelMatCorrespH h;
-    kelMatCorrespP p;
-    for (int i = 0; i < 10001; ++i) {
-        h.add(float(i), 1, 2, 3);
-        p.add(float(i), 1, 2, 3, 4);
-    }
-    EXPECT_EQ(h.m_Num, 10000);
-    EXPECT_EQ(h.m_DstY.size(), 10000u);
-    EXPECT_EQ(h.m_SrcX.back(), 9999);
-    EXPECT_EQ(p.m_Num, 10000);
-    EXPECT_EQ(p.m_ImgY.size(), 10000u);
+TYPED_TEST(Correspondences, StopGrowingSilentlyAtTheirMost) {
+    std::mt19937 random = kel_test::generator(70);
+    typename TypeParam::Set set = pairs<TypeParam>(10000, 0, 0, random);
+    const typename TypeParam::Set before = set;
+    addPairs<TypeParam>(set, TypeParam::transform(random), 1, 0, 0, random);
+    EXPECT_EQ(set.m_Num, 10000);
+    for (auto values : TypeParam::kCoordinates)
+        EXPECT_EQ(set.*values, before.*values);
 }
 
-TEST(Correspondences, StayWholeWhereMemoryRunsOut) {
+TYPED_TEST(Correspondences, StayWholeWhereMemoryRunsOut) {
     if (!kel_test::ownMalloc())
         GTEST_SKIP() << "another malloc is in use";
-    for (int number = 0; number < 5; ++number) {
-        kelMatCorrespP set;
-        set.add(1, 2, 3, 4, 5);
+    std::mt19937 random = kel_test::generator(70);
+    kelMat transform = TypeParam::transform(random);
+    const float noise[4] = {};
+    for (int number = 0; number < TypeParam::kColumns + 1; ++number) {
+        typename TypeParam::Set set = pairs<TypeParam>(1, 0, 0, random);
         {
             const kel_test::ScarceMemory memory(number);
-            EXPECT_THROW(set.add(6, 7, 8, 9, 10), std::bad_alloc);
+            EXPECT_THROW(TypeParam::addPair(set, transform, noise, true, random), std::bad_alloc);
         }
         EXPECT_EQ(set.m_Num, 1);
-        for (const auto* values : {&set.m_ObjX, &set.m_ObjY, &set.m_ObjZ, &set.m_ImgX, &set.m_ImgY})
-            EXPECT_EQ(values->size(), 1u) << number;
+        for (auto values : TypeParam::kCoordinates)
+            EXPECT_EQ((set.*values).size(), 1u) << number;
     }
 }
 
-TEST(Correspondences, NormaliseAsTheReferenceDoes) {
+TYPED_TEST(Correspondences, NormaliseAsTheReferenceDoes) {
     std::mt19937 random = kel_test::generator(71);
     for (int n : {0, 1, 2, 3, 5, 17, 1000}) {
-        kelMatCorrespH h, h1, h2;
-        kelMatCorrespP p, p1, p2;
-        addPairs(h, homography(random), n, 1, 0.3f, random);
-        addPairs(p, projection(random), n, 1, 0.3f, random);
+        typename TypeParam::Set set = pairs<TypeParam>(n, 1, 0.3f, random), normalised, expected;
         kelMat A1(2, 2, true), A2, B1, B2;
-        h.normalize(h1, A1, A2);
-        kel_ref::normalize(h, h2, B1, B2);
+        set.normalize(normalised, A1, A2);
+        kel_ref::normalize(set, expected, B1, B2);
         EXPECT_TRUE(same(A1, B1));
         EXPECT_TRUE(same(A2, B2));
-        EXPECT_EQ(h1.m_Num, n);
-        if (n > 1) {
-            EXPECT_EQ(h1.m_SrcX, h2.m_SrcX);
-            EXPECT_EQ(h1.m_SrcY, h2.m_SrcY);
-            EXPECT_EQ(h1.m_DstX, h2.m_DstX);
-            EXPECT_EQ(h1.m_DstY, h2.m_DstY);
-        }
-        p.normalize(p1, A1, A2);
-        kel_ref::normalize(p, p2, B1, B2);
-        EXPECT_TRUE(same(A1, B1));
-        EXPECT_TRUE(same(A2, B2));
-        if (n > 1) {
-            EXPECT_EQ(p1.m_ObjX, p2.m_ObjX);
-            EXPECT_EQ(p1.m_ObjY, p2.m_ObjY);
-            EXPECT_EQ(p1.m_ObjZ, p2.m_ObjZ);
-            EXPECT_EQ(p1.m_ImgX, p2.m_ImgX);
-            EXPECT_EQ(p1.m_ImgY, p2.m_ImgY);
-        }
+        EXPECT_EQ(normalised.m_Num, n);
+        for (auto values : TypeParam::kCoordinates)
+            if (n > 1) {
+                EXPECT_EQ(normalised.*values, expected.*values);
+            }
     }
 }
 
-TEST(Correspondences, NormaliseIntoAFilledSetScalesItsFirstEntries) {
+TEST(Normalisation, ScalesTheFirstEntriesOfAFilledSet) {
     kelMatCorrespH in, out;
     in.add(0, 0, 0, 0);
     in.add(2, 0, 0, 4);
@@ -171,7 +111,7 @@ TEST(Correspondences, NormaliseIntoAFilledSetScalesItsFirstEntries) {
     EXPECT_EQ(out.m_SrcX, (std::vector<float>{10 * s1, -1 * s1, 1}));
 }
 
-TEST(Correspondences, NormaliseRefusesShortSequencesAndLeavesTheOutputAlone) {
+TEST(Normalisation, RefusesShortSequencesAndLeavesTheOutputAlone) {
     kelMatCorrespH h, out;
     h.add(1, 2, 3, 4);
     h.m_Num = 2;
@@ -206,7 +146,7 @@ TEST(UnitSquare, TakesItsCornersInOrder) {
 TEST(FourPoints, GiveTheHomographyThroughThem) {
     std::mt19937 random = kel_test::generator(72);
     for (int round = 0; round < 50; ++round) {
-        kelMat truth = homography(random);
+        kelMat truth = Plane::transform(random);
         kelMatCorrespH s;
         const float corners[4][2] = {{20, 30}, {40, 450}, {600, 440}, {620, 10}};
         for (const float* c : corners) {
@@ -226,54 +166,41 @@ TEST(FourPoints, GiveTheHomographyThroughThem) {
     EXPECT_FALSE(std::isfinite(H[0][0]));
 }
 
-TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
+TYPED_TEST(LeastSquares, EqualsTheReferenceAndFindsTheTruth) {
     std::mt19937 random = kel_test::generator(73);
+    constexpr bool plane = TypeParam::kColumns == 3;
     for (int n : {5, 6, 7, 20, 101, 2000}) {
-        kelMat truth = homography(random), P = projection(random);
-        kelMatCorrespH h;
-        kelMatCorrespP p;
-        addPairs(h, truth, n, n > 6 ? 0.5f : 0, 0, random);
-        addPairs(p, P, n, n > 6 ? 0.5f : 0, 0, random);
-        kelMatEstimatorH H, expected;
-        EXPECT_TRUE(H.estimate_byLSM(h));
-        kel_ref::leastSquares(expected, h);
-        EXPECT_TRUE(same(H, expected));
-        EXPECT_TRUE(H.estimate_byLSM_fine(h));
-        kel_ref::leastSquaresFine(expected, h, 5);
-        EXPECT_TRUE(same(H, expected));
-        EXPECT_NEAR(H[2][2], 1, 1e-6);
-        EXPECT_LT(distanceOf(H, truth), n == 7 ? 60.0f : 8.0f) << n;
-        if (n < 6)
+        const kelMat truth = TypeParam::transform(random);
+        typename TypeParam::Set set;
+        addPairs<TypeParam>(set, truth, n, n > 6 ? 0.5f : 0, 0, random);
+        if (n < TypeParam::kRules.least)
             continue;
-        kelMatEstimatorP Q, expectedP;
-        EXPECT_TRUE(Q.estimate_byLSM(p));
-        kel_ref::leastSquares(expectedP, p);
-        EXPECT_TRUE(same(Q, expectedP));
-        EXPECT_TRUE(Q.estimate_byLSM_fine(p));
-        kel_ref::leastSquaresFine(expectedP, p, 6);
-        EXPECT_TRUE(same(Q, expectedP));
-        if (n >= 20) {
-            EXPECT_LT(distanceOfProjections(Q, P), 6.0f) << n;
+        typename TypeParam::Estimator fit, expected;
+        EXPECT_TRUE(fit.estimate_byLSM(set));
+        kel_ref::leastSquares(expected, set);
+        EXPECT_TRUE(same(fit, expected));
+        EXPECT_TRUE(fit.estimate_byLSM_fine(set));
+        kel_ref::leastSquaresFine(expected, set, TypeParam::kRules.least);
+        EXPECT_TRUE(same(fit, expected));
+        if (plane) {
+            EXPECT_NEAR(fit[2][2], 1, 1e-6);
+            EXPECT_LT(distanceOf(fit, truth, TypeParam()), n == 7 ? 60.0f : 8.0f) << n;
+        } else if (n >= 20) {
+            EXPECT_LT(distanceOf(fit, truth, TypeParam()), 6.0f) << n;
         }
     }
 }
 
 // On noisy data: with exact pairs the factorised matrix is singular, and rounding decides.
-TEST(LeastSquares, TakesTheFirstOfEqualSingularValues) {
-    kelMatCorrespH h;
-    kelMatCorrespP p;
-    for (int i = 0; i < 6; ++i) {
-        h.add(0, 0, 0, 0);
-        p.add(0, 0, 0, 0, 0);
-    }
-    kelMatEstimatorH H, expected;
-    H.estimate_byLSM(h);
-    kel_ref::leastSquares(expected, h);
-    EXPECT_TRUE(same(H, expected));
-    kelMatEstimatorP P, expectedP;
-    P.estimate_byLSM(p);
-    kel_ref::leastSquares(expectedP, p);
-    EXPECT_TRUE(same(P, expectedP));
+TYPED_TEST(LeastSquares, TakesTheFirstOfEqualSingularValues) {
+    typename TypeParam::Set set;
+    for (auto values : TypeParam::kCoordinates)
+        (set.*values).assign(6, 0.0f);
+    set.m_Num = 6;
+    typename TypeParam::Estimator fit, expected;
+    fit.estimate_byLSM(set);
+    kel_ref::leastSquares(expected, set);
+    EXPECT_TRUE(same(fit, expected));
 }
 
 namespace {
@@ -295,8 +222,7 @@ void expectTaubinLikeReference(kelMatCorrespP& set) {
 TEST(Taubin, NeverChoosesAnEigenvalueThatNoIntHolds) {
     std::mt19937 random = kel_test::generator(80);
     for (int round = 0; round < 8; ++round) { // tiny objects give huge eigenvalues
-        kelMatCorrespP wide, p;
-        addPairs(wide, projection(random), 9, 0, 0, random);
+        kelMatCorrespP wide = pairs<Space>(9, 0, 0, random), p;
         for (int i = 0; i < wide.m_Num; ++i)
             p.add(wide.m_ObjX[i] * 1e-4f, wide.m_ObjY[i] * 1e-4f, wide.m_ObjZ[i] * 1e-4f, wide.m_ImgX[i] / 100,
                   wide.m_ImgY[i] / 100);
@@ -307,11 +233,11 @@ TEST(Taubin, NeverChoosesAnEigenvalueThatNoIntHolds) {
 TEST(Taubin, EqualsTheReferenceAndFindsTheTruth) {
     std::mt19937 random = kel_test::generator(74);
     for (int n : {20, 100, 1000}) {
-        kelMat truth = homography(random), P = projection(random);
+        kelMat truth = Plane::transform(random), P = Space::transform(random);
         kelMatCorrespH wide, h;
         kelMatCorrespP wideP, p;
-        addPairs(wide, truth, n, 1.0f, 0, random);
-        addPairs(wideP, P, n, 1.0f, 0, random);
+        addPairs<Plane>(wide, truth, n, 1.0f, 0, random);
+        addPairs<Space>(wideP, P, n, 1.0f, 0, random);
         kelMat T1, T2;
         wide.normalize(h, T1, T2);
         kelMatEstimatorH H, expected;
@@ -352,10 +278,8 @@ TEST(Taubin, FillsWithNaNWhereTheEigenproblemHasNoSolution) {
 TEST(Fits, RefuseSmallSetsAndKeepTheirContents) {
     testing::internal::CaptureStdout();
     std::mt19937 random = kel_test::generator(75);
-    kelMatCorrespH h;
-    kelMatCorrespP p;
-    addPairs(h, homography(random), 4, 0, 0, random);
-    addPairs(p, projection(random), 5, 0, 0, random);
+    kelMatCorrespH h = pairs<Plane>(4, 0, 0, random);
+    kelMatCorrespP p = pairs<Space>(5, 0, 0, random);
     kelMatEstimatorH H;
     kelMatEstimatorP P;
     H.setDataIdentity(3);
@@ -363,8 +287,7 @@ TEST(Fits, RefuseSmallSetsAndKeepTheirContents) {
     const kelMat beforeH = H, beforeP = P;
     EXPECT_FALSE(H.estimate_byLSM(h) || H.estimate_byLSM_fine(h) || H.estimate_byTaubin(h));
     EXPECT_FALSE(P.estimate_byLSM(p) || P.estimate_byLSM_fine(p) || P.estimate_byTaubin(p) || P.estimate_byRANSAC_fine(p, 1));
-    kelMatCorrespH three;
-    addPairs(three, homography(random), 3, 0, 0, random);
+    kelMatCorrespH three = pairs<Plane>(3, 0, 0, random);
     int count = 99;
     EXPECT_FALSE(H.estimate_byRANSAC_fine(three, 1, &count));
     EXPECT_TRUE(same(H, beforeH));
@@ -376,10 +299,8 @@ TEST(Fits, RefuseSmallSetsAndKeepTheirContents) {
 // As a product of matrices does.
 TEST(Fits, StopOnAnEstimatorOfAnotherSize) {
     std::mt19937 random = kel_test::generator(79);
-    kelMatCorrespH h;
-    kelMatCorrespP p;
-    addPairs(h, homography(random), 20, 0, 0, random);
-    addPairs(p, projection(random), 20, 0, 0, random);
+    kelMatCorrespH h = pairs<Plane>(20, 0, 0, random);
+    kelMatCorrespP p = pairs<Space>(20, 0, 0, random);
     const char *const text = "this->m_Width == M.m_Height", *const file = "kelMat/src/kelMat.cpp",
                       *const product = "kelMat kelMat::operator*(const kelMat&) const";
     kelMatEstimatorH H, plain;
@@ -442,11 +363,11 @@ TEST(Plausibility, HasAbsoluteBoundsThatNaNPasses) {
 TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
     std::mt19937 random = kel_test::generator(76);
     for (int n : {0, 1, 2, 3, 4, 5, 7, 8, 9, 15, 16, 17, 255, 256, 257, 513}) {
-        kelMat H = homography(random), P = projection(random);
+        kelMat H = Plane::transform(random), P = Space::transform(random);
         kelMatCorrespH h;
         kelMatCorrespP p;
-        addPairs(h, H, n, 2, 0.3f, random);
-        addPairs(p, P, n, 2, 0.3f, random);
+        addPairs<Plane>(h, H, n, 2, 0.3f, random);
+        addPairs<Space>(p, P, n, 2, 0.3f, random);
         if (n > 5)
             h.m_SrcX[5] = p.m_ObjX[5] = kel_test::kNan;
         for (float threshold : {0.0f, 0.5f, 1.5f, -1.5f, 1e20f}) {
@@ -471,8 +392,8 @@ TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
     EXPECT_EQ(judgeInliers(flat, onBoundP, mask, 5), 0);
     // Just at the error of one pair after the other: a sum in another order counts some of them differently.
     kelMatCorrespP close;
-    kelMat P = projection(random);
-    addPairs(close, P, 200, 2, 0, random);
+    kelMat P = Space::transform(random);
+    addPairs<Space>(close, P, 200, 2, 0, random);
     std::vector<bool> closeMask(200), expectedMask(200);
     for (int i = 0; i < close.m_Num; ++i) {
         float u, v;
@@ -496,71 +417,50 @@ TEST(Inliers, AreCountedStrictlyAndMarkedForEveryLength) {
 
 namespace {
 
-void expectRansacLikeReference(kelMatCorrespH& set, unsigned seed) {
-    kelMatEstimatorH H, expected;
+template <class Kind> void expectRansacLikeReference(typename Kind::Set set, unsigned seed) {
+    constexpr bool plane = Kind::kColumns == 3; // only there inliers are counted for the caller
+    typename Kind::Estimator fit, expected;
     int count = -5, expectedCount = -5;
+    const float threshold = plane ? 2 : 4;
     srand(seed);
-    const bool ok = H.estimate_byRANSAC_fine(set, 2, &count);
+    const bool ok = Kind::ransac(fit, set, threshold, &count);
     const int next = rand();
     srand(seed);
-    EXPECT_EQ(ok, kel_ref::ransac(expected, set, 2, &expectedCount, {5, 4, 50, true}));
+    EXPECT_EQ(ok, kel_ref::ransac(expected, set, threshold, plane ? &expectedCount : nullptr, Kind::kRules));
     EXPECT_EQ(next, rand()) << "the number of draws";
     EXPECT_EQ(count, expectedCount);
-    EXPECT_TRUE(same(H, expected));
-}
-
-void expectRansacLikeReference(kelMatCorrespP& set, unsigned seed) {
-    kelMatEstimatorP P, expected;
-    srand(seed);
-    const bool ok = P.estimate_byRANSAC_fine(set, 4);
-    const int next = rand();
-    srand(seed);
-    EXPECT_EQ(ok, kel_ref::ransac(expected, set, 4, nullptr, {6, 6, 400, false}));
-    EXPECT_EQ(next, rand()) << "the number of draws";
-    EXPECT_TRUE(same(P, expected));
+    EXPECT_TRUE(same(fit, expected));
 }
 
 } // namespace
 
-TEST(Ransac, StopsAtEnoughInliersAndNotOneBefore) {
+TYPED_TEST(RansacOf, StopsAtEnoughInliersAndNotOneBefore) {
     std::mt19937 random = kel_test::generator(79);
     for (int fewer : {0, 1}) {
-        kelMatCorrespH h;
-        addPairs(h, homography(random), 50 - fewer, 0, 0, random);
-        addPairs(h, homography(random), 60, 0, 1, random);
-        expectRansacLikeReference(h, random());
-        kelMatCorrespP p;
-        addPairs(p, projection(random), 400 - fewer, 0, 0, random);
-        addPairs(p, projection(random), 100, 0, 1, random);
-        expectRansacLikeReference(p, random());
+        typename TypeParam::Set set = pairs<TypeParam>(TypeParam::kRules.enough - fewer, 0, 0, random);
+        addPairs<TypeParam>(set, TypeParam::transform(random), 100, 0, 1, random);
+        expectRansacLikeReference<TypeParam>(set, random());
     }
 }
 
-TEST(Ransac, EqualsTheReferenceToTheBitAndToTheDraw) {
+TYPED_TEST(RansacOf, EqualsTheReferenceToTheBitAndToTheDraw) {
     KEL_NOT_UNDER_VALGRIND("it adds only time");
     std::mt19937 random = kel_test::generator(77);
     for (int n : {4, 5, 6, 7, 10, 30, 49, 50, 60, 120, 450})
-        for (float outliers : {0.0f, 0.2f, 0.5f, 0.8f, 1.0f}) {
-            kelMatCorrespH h;
-            addPairs(h, homography(random), n, 1, outliers, random);
-            SCOPED_TRACE(std::to_string(n) + " pairs, outliers " + std::to_string(outliers));
-            const unsigned seed = random();
-            expectRansacLikeReference(h, seed);
-            if (n >= 6 && (n < 100 || outliers < 0.4f)) {
-                kelMatCorrespP p;
-                addPairs(p, projection(random), n, 1, outliers, random);
-                expectRansacLikeReference(p, seed);
+        for (float outliers : {0.0f, 0.2f, 0.5f, 0.8f, 1.0f})
+            if (TypeParam::kColumns == 3 || (n >= 6 && (n < 100 || outliers < 0.4f))) {
+                SCOPED_TRACE(std::to_string(n) + " pairs, outliers " + std::to_string(outliers));
+                expectRansacLikeReference<TypeParam>(pairs<TypeParam>(n, 1, outliers, random), random());
             }
-        }
 }
 
 TEST(Ransac, FindsTheTruthAmongOutliers) {
     std::mt19937 random = kel_test::generator(78);
     int near = 0;
     for (int round = 0; round < 20; ++round) {
-        kelMat truth = homography(random);
+        kelMat truth = Plane::transform(random);
         kelMatCorrespH h;
-        addPairs(h, truth, 200, 0.5f, 0.4f, random);
+        addPairs<Plane>(h, truth, 200, 0.5f, 0.4f, random);
         kelMatEstimatorH H;
         srand(random());
         near += H.estimate_byRANSAC_fine(h, 3, nullptr) && distanceOf(H, truth) < 3;
@@ -572,7 +472,7 @@ TEST(Ransac, FindsTheTruthAmongOutliers) {
     mirror[0][0] = -1;
     mirror[0][2] = 640;
     kelMatCorrespH h;
-    addPairs(h, mirror, 100, 0, 0, random);
+    addPairs<Plane>(h, mirror, 100, 0, 0, random);
     kelMatEstimatorH H;
     EXPECT_FALSE(H.estimate_byRANSAC_fine(h, 3, nullptr)) << "a mirror is never returned";
 }

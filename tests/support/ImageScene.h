@@ -23,6 +23,7 @@ struct Setting {
     int half = -1;           // columns that it is wider than it has to be; negative for null
     Size dst = {INT_MIN, 0}; // where it is not what the operation makes of the source's
     ptrdiff_t spare = 0;     // bytes behind the data; negative where rows end with their last pixel
+    Size scratch = {0, 0};   // columns and rows that the scratch image has more than the source
 };
 
 inline std::ostream& operator<<(std::ostream& out, const Setting& s) {
@@ -40,7 +41,7 @@ public:
         if (s.fill != Fill::Random)
             m_src.fill(s.fill, 5);
         if (o.tmp != kNoType)
-            m_tmp.emplace(s.src.width, s.src.height, o.tmp, s.guard);
+            m_tmp.emplace(s.src.width + s.scratch.width, s.src.height + s.scratch.height, o.tmp, s.guard);
         if (s.half >= 0)
             m_half.emplace((std::max(s.src.width, 0) + 1) / 2 + s.half, (s.src.height + 1) / 2, 0, s.guard);
     }
