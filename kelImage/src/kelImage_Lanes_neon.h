@@ -63,27 +63,6 @@ inline void store(void* p, Lanes1 a) {
 inline void storeHalf(void* p, Lanes1 a) {
     vst1_u8(static_cast<uint8_t*>(p), vget_low_u8(a.v));
 }
-inline void storeLanes(uint8_t* p, ptrdiff_t, Lanes1 a) {
-    store(p, a);
-}
-inline void storeInTurn(void* p, Lanes1 a, Lanes1 b) {
-    store(p, a);
-    store(static_cast<uint8_t*>(p) + 16, b);
-}
-inline void storeInTurn(uint8_t* p, Lanes1 a, Lanes1 b, Lanes1 c) {
-    storeInTurn(p, a, b);
-    store(p + 32, c);
-}
-inline void loadInTurn(const uint8_t* p, Lanes1& a, Lanes1& b, Lanes1& c) {
-    a = Lanes1::load(p), b = Lanes1::load(p + 16), c = Lanes1::load(p + 32);
-}
-constexpr int kTwelveSpare = 16;
-inline Lanes1 loadTwelves(const uint8_t* p, Lanes1) {
-    return Lanes1::load(p);
-}
-inline void storeTwelves(uint8_t* p, Lanes1 a) {
-    store(p, a);
-}
 // One store each: the architecture stores single elements out of a vector.
 template <int i = 0> void storeThirds(uint8_t* p, Lanes1 a) {
     vst1q_lane_u8(p + 3 * i, a.v, i);
@@ -94,9 +73,6 @@ template <int i = 0> void storeThirds(int16_t* p, Lanes1 a) {
     vst1q_lane_s16(p + 3 * i, a.s16(), i);
     if constexpr (i < 7)
         storeThirds<i + 1>(p, a);
-}
-inline Lanes1 reversedLanes(Lanes1 a) {
-    return a;
 }
 
 inline Lanes1 operator&(Lanes1 a, Lanes1 b) {
@@ -246,12 +222,6 @@ inline Lanes1 evenLongs(Lanes1 a, Lanes1 b) {
 inline Lanes1 oddLongs(Lanes1 a, Lanes1 b) {
     return vuzp2q_u32(a.u32(), b.u32());
 }
-inline Lanes1 ordered(Lanes1 ab) {
-    return ab;
-}
-inline Lanes1 narrowedWords(Lanes1 a, Lanes1 b) {
-    return packWords(a, b);
-}
 inline Lanes1 narrowedLongs(Lanes1 a, Lanes1 b) {
     return vqmovun_high_s32(vqmovun_s32(a.s32()), b.s32());
 }
@@ -287,5 +257,7 @@ inline Lanes1 rounded(Floats1 a) {
 }
 
 } // namespace
+
+#include "kelImage_Lanes_one.h"
 
 #endif

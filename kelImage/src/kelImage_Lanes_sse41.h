@@ -64,31 +64,6 @@ inline void store(void* p, Lanes1 a) {
 inline void storeHalf(void* p, Lanes1 a) {
     _mm_storel_epi64(static_cast<__m128i*>(p), a.v);
 }
-// Lane k to p + k * stride, lower lanes first.
-inline void storeLanes(uint8_t* p, ptrdiff_t, Lanes1 a) {
-    store(p, a);
-}
-// Lane k of each in turn: a0 b0, a1 b1, ...
-inline void storeInTurn(void* p, Lanes1 a, Lanes1 b) {
-    store(p, a);
-    store(static_cast<uint8_t*>(p) + 16, b);
-}
-// a0 b0 c0, a1 b1 c1, ...
-inline void storeInTurn(uint8_t* p, Lanes1 a, Lanes1 b, Lanes1 c) {
-    storeInTurn(p, a, b);
-    store(p + 32, c);
-}
-inline void loadInTurn(const uint8_t* p, Lanes1& a, Lanes1& b, Lanes1& c) {
-    a = Lanes1::load(p), b = Lanes1::load(p + 16), c = Lanes1::load(p + 32);
-}
-// The first twelve bytes of every lane, one after another; kTwelveSpare bytes behind them are read or written, too.
-constexpr int kTwelveSpare = 16;
-inline Lanes1 loadTwelves(const uint8_t* p, Lanes1) {
-    return Lanes1::load(p);
-}
-inline void storeTwelves(uint8_t* p, Lanes1 a) {
-    store(p, a);
-}
 // Bytes or words to every third place; what lies between is not written.
 inline void storeThirds(uint8_t* p, Lanes1 a) {
     uint64_t low = static_cast<uint64_t>(_mm_cvtsi128_si64(a.v)), high = static_cast<uint64_t>(_mm_extract_epi64(a.v, 1));
@@ -108,10 +83,6 @@ inline void storeThirds(int16_t* p, Lanes1 a) {
 inline void storeThreesReversed(uint8_t* d, const uint8_t* p, Lanes1) {
     const __m128i reverse = _mm_setr_epi8(13, 14, 15, 10, 11, 12, 7, 8, 9, 4, 5, 6, 1, 2, 3, 0);
     store(d, Lanes1{_mm_shuffle_epi8(Lanes1::load(p - 1).v, reverse)});
-}
-// The lanes in the opposite order.
-inline Lanes1 reversedLanes(Lanes1 a) {
-    return a;
 }
 
 inline Lanes1 operator&(Lanes1 a, Lanes1 b) {
@@ -257,15 +228,7 @@ inline Lanes1 evenLongs(Lanes1 a, Lanes1 b) {
 inline Lanes1 oddLongs(Lanes1 a, Lanes1 b) {
     return {_mm_castps_si128(_mm_shuffle_ps(_mm_castsi128_ps(a.v), _mm_castsi128_ps(b.v), _MM_SHUFFLE(3, 1, 3, 1)))};
 }
-// What has a half of each lane from a and the other from b, as packs and every second long have, in the order of memory: all of
-// a, then all of b.
-inline Lanes1 ordered(Lanes1 ab) {
-    return ab;
-}
-// Words and longs that are not negative, narrowed in the order of memory.
-inline Lanes1 narrowedWords(Lanes1 a, Lanes1 b) {
-    return ordered(packWords(a, b));
-}
+// Longs that are not negative, as words in the order of memory.
 inline Lanes1 narrowedLongs(Lanes1 a, Lanes1 b) {
     return {_mm_packus_epi32(a.v, b.v)};
 }
@@ -302,5 +265,7 @@ inline Lanes1 truncated(Floats1 a) {
 }
 
 } // namespace
+
+#include "kelImage_Lanes_one.h"
 
 #endif
