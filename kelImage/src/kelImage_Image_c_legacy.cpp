@@ -32,6 +32,19 @@ void copyRows(unsigned char* dst, ptrdiff_t dstPitch, const unsigned char* src, 
         memcpy(dst, src, bytes);
 }
 
+// The rows of the corner that an image and an area of these extents share, one way or the other; pitches in pixels.
+void copyCorner(const kelImage_t* image, kelValue_s32 width, kelValue_s32 height, void* dst, ptrdiff_t dstPitch,
+                const void* src, ptrdiff_t srcPitch) {
+    const kelValue_s32 w = std::min(width, image->width), h = std::min(height, image->height);
+    if (w < 1)
+        return;
+    kel::withPixel(image->type, [=](auto pixel) {
+        const ptrdiff_t bytes = sizeof(pixel);
+        copyRows(static_cast<unsigned char*>(dst), dstPitch * bytes, static_cast<const unsigned char*>(src), srcPitch * bytes,
+                 w * bytes, h);
+    });
+}
+
 } // namespace
 
 extern "C" {
@@ -85,25 +98,11 @@ void clearKelImage(kelImage_t* image) {
 }
 
 void loadKelImageData(kelImage_t* image, const void* src, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch) {
-    const kelValue_s32 w = std::min(width, image->width);
-    const kelValue_s32 h = std::min(height, image->height);
-    if (w < 1)
-        return;
-    kel::withPixel(image->type, [=](auto pixel) {
-        const ptrdiff_t bytes = sizeof(pixel);
-        copyRows(image->data, image->step * bytes, static_cast<const unsigned char*>(src), pitch * bytes, w * bytes, h);
-    });
+    copyCorner(image, width, height, image->data, image->step, src, pitch);
 }
 
 void storeKelImageData(void* dst, kelValue_s32 width, kelValue_s32 height, kelValue_s32 pitch, const kelImage_t* image) {
-    const kelValue_s32 w = std::min(width, image->width);
-    const kelValue_s32 h = std::min(height, image->height);
-    if (w < 1)
-        return;
-    kel::withPixel(image->type, [=](auto pixel) {
-        const ptrdiff_t bytes = sizeof(pixel);
-        copyRows(static_cast<unsigned char*>(dst), pitch * bytes, image->data, image->step * bytes, w * bytes, h);
-    });
+    copyCorner(image, width, height, dst, pitch, image->data, image->step);
 }
 
 kelImage_t* loadKelImage(const char*) {

@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <cstring>
 #include <kel/kelImage.h>
+#include <numeric>
 #include <vector>
 
 namespace kel_ref {
@@ -103,33 +104,33 @@ inline void linearInterpolation(kelImage_t* dst, const kelImage_t* src) {
         }
 }
 
+// Every input repeated, so many of them averaged.
+inline std::vector<uint8_t> averages(const std::vector<uint8_t>& in, int outputs) {
+    const int inputs = static_cast<int>(in.size()), g = greatestCommonDivisor(outputs, inputs), box = inputs / g;
+    std::vector<uint8_t> held, out;
+    for (uint8_t value : in)
+        held.insert(held.end(), outputs / g, value);
+    for (auto first = held.begin(); first != held.end(); first += box)
+        out.push_back(static_cast<uint8_t>(std::accumulate(first, first + box, 0) / box));
+    return out;
+}
+
 inline void zeroOrderHoldPlusAverage(kelImage_t* dst, const kelImage_t* src) {
-    const int Dw = dst->width, Dh = dst->height, Sw = src->width, Sh = src->height;
-    const int a = Dw / greatestCommonDivisor(Dw, Sw), b = Sw / greatestCommonDivisor(Dw, Sw);
-    const int c = Dh / greatestCommonDivisor(Dh, Sh), d = Sh / greatestCommonDivisor(Dh, Sh);
-    std::vector<uint8_t> w(src->data, src->data + static_cast<size_t>(Sw) * Sh * 4);
     for (int channel = 0; channel < 4; ++channel) {
-        for (int r = 0; r < Sh; ++r) {
-            std::vector<int> held;
-            for (int k = 0; k < Sw; ++k)
-                held.insert(held.end(), a, w[(r * Sw + k) * 4 + channel]);
-            for (int j = 0; j < Dw; ++j) {
-                int sum = 0;
-                for (int t = j * b; t < j * b + b; ++t)
-                    sum += held[t];
-                w[(r * Sw + j) * 4 + channel] = static_cast<uint8_t>(sum / b);
-            }
+        std::vector<std::vector<uint8_t>> rows;
+        for (int y = 0; y < src->height; ++y) {
+            std::vector<uint8_t> row;
+            for (int x = 0; x < src->width; ++x)
+                row.push_back(src->data[(y * src->width + x) * 4 + channel]);
+            rows.push_back(averages(row, dst->width));
         }
-        for (int x = 0; x < Dw; ++x) {
-            std::vector<int> held;
-            for (int k = 0; k < Sh; ++k)
-                held.insert(held.end(), c, w[(k * Sw + x) * 4 + channel]);
-            for (int y = 0; y < Dh; ++y) {
-                int sum = 0;
-                for (int t = y * d; t < y * d + d; ++t)
-                    sum += held[t];
-                dst->data[(y * Dw + x) * 4 + channel] = static_cast<uint8_t>(sum / d);
-            }
+        for (int x = 0; x < dst->width; ++x) {
+            std::vector<uint8_t> column;
+            for (const auto& row : rows)
+                column.push_back(row[x]);
+            column = averages(column, dst->height);
+            for (int y = 0; y < dst->height; ++y)
+                dst->data[(y * dst->width + x) * 4 + channel] = column[y];
         }
     }
 }
