@@ -101,10 +101,14 @@ void digestTurns() {
 void digestRegistration(unsigned seed) {
     const std::string name = "scene " + std::to_string(seed) + ", ";
     const kel_examples::Scene scene = kel_examples::renderScene(seed);
-    Digest pictures, features, result;
-    for (const auto* picture : {&scene.first, &scene.second})
+    Digest pictures, prepared, features, result;
+    for (const auto* picture : {&scene.first, &scene.second}) {
         pictures.add((*picture)->data, static_cast<size_t>((*picture)->size));
+        const std::vector<unsigned char> bytes = kelRegister::Prepared(picture->get()).store();
+        prepared.add(bytes.data(), bytes.size());
+    }
     pictures.print(name + "pictures");
+    prepared.print(name + "prepared");
     std::srand(seed);
     const kelRegister::Result r = kelRegister::registerPictures(scene.first.get(), scene.second.get());
     for (const auto* set : {&r.first, &r.second})
