@@ -279,12 +279,10 @@ def connect(arguments: argparse.Namespace, folder: str) -> Any:
         from distributed import Client, LocalCluster
     except ImportError as error:
         raise Refused(f"this takes Dask's distributed scheduler (Debian's python3-distributed): {error}") from error
-    for name in list(logging.root.manager.loggerDict):
-        if name.split(".")[0] in ("distributed", "tornado"):
-            logging.getLogger(name).setLevel(logging.CRITICAL)  # what goes wrong is said here
+    logging.disable(logging.CRITICAL)  # what goes wrong is said here
     try:
         if arguments.scheduler:
-            client = Client(arguments.scheduler, timeout=5)
+            client = Client(arguments.scheduler, timeout=10)
             client.wait_for_workers(1, timeout=60)
             theirs = client.submit(_version, pure=False).result(timeout=60)
             if theirs != kel.__version__:

@@ -1,6 +1,7 @@
 """kel.batch: rows for all pairs, once each, whatever is killed, cut or unreadable."""
 
 import csv
+import json
 import os
 import re
 import signal
@@ -58,7 +59,8 @@ def start(survey, output, *more):
 def wait_for(condition, process):
     end = time.monotonic() + 60
     while not condition():
-        assert time.monotonic() < end and process.poll() is None
+        assert time.monotonic() < end
+        assert process.poll() is None, process.stderr and process.stderr.read()
         time.sleep(0.02)
 
 
@@ -106,6 +108,32 @@ def test_cluster(survey, tmp_path):
             numbers.append({row["id"]: row["h13"] for row in rows(tmp_path / memory)})
     assert counts[0] > 10 == counts[1]
     assert numbers[0] == numbers[1]
+
+
+def test_scheduler_killed(survey, tmp_path):
+    """A cluster's scheduler is killed: the run says so in one line, and the next one goes on from there without a cluster."""
+    file, module = tmp_path / "scheduler.json", [sys.executable, "-m", "distributed.cli.dask_"]
+    quiet = {"stdout": subprocess.DEVNULL, "stderr": subprocess.DEVNULL}
+    start_one = lambda kind, *more: subprocess.Popen([*module[:2], module[2] + kind, "--scheduler-file", str(file), "--no-dashboard", *more],
+                                                     cwd=tmp_path, **quiet)
+    scheduler, worker = start_one("scheduler", "--port", "0", "--host", "127.0.0.1"), start_one("worker", "--nthreads", "1", "--no-nanny")
+    try:
+        wait_for(file.exists, scheduler)
+        run = start(survey, tmp_path / "out", "--scheduler", json.loads(file.read_text())["address"])
+        lines = lambda: len(rows(tmp_path / "out")) if (tmp_path / "out" / "results.csv").exists() else 0
+        wait_for(lambda: lines() > 4, run)
+        scheduler.kill()
+        message = run.communicate(timeout=120)[1]
+    finally:
+        for process in (scheduler, worker):
+            process.kill()
+            process.wait()
+    assert run.returncode == 1 and message.rstrip().splitlines()[-1].endswith("run the same again, and it goes on from here")
+    assert "Traceback" not in message and 4 < lines() < 58
+    again = start(survey, tmp_path / "out", "--workers", "1")
+    message = again.communicate()[1]
+    assert again.returncode == 0 and "of 58 pairs are there already" in message
+    check(tmp_path / "out", message)
 
 
 def test_refused(survey, tmp_path):
