@@ -113,9 +113,9 @@ bool fitRobustly(const std::vector<Pair>& proposing, const std::vector<Pair>& po
 std::vector<bool> agreeing(const Map& H, const std::vector<Pair>& pairs, Bound bound) {
     const Map back = H.inverse();
     std::vector<bool> marks;
-    for (const Pair& p : pairs) {
+    marks.reserve(pairs.size());
+    for (const Pair& p : pairs)
         marks.push_back(distance(H.at(p.first), p.second) < bound.second || distance(back.at(p.second), p.first) < bound.first);
-    }
     return marks;
 }
 
