@@ -33,7 +33,7 @@ struct Ratio {
         const kelValue_s32 common = kel::divisor(kel::gcd(outputs, inputs));
         const int twice = inputs == common || box / common > kByteBox ? 2 : 1;
         repeat = repeat / common * twice;
-        box = box / common * twice;
+        box = kel::divisor(box / common * twice);
     }
     bool isHalf() const { return repeat == 1 && box == 2; }
     Box at(kelValue_s32 output) const {
@@ -101,7 +101,7 @@ private:
             int64_t sum = 0;
             for (kelValue_s32 k = box.first; k <= box.last; ++k)
                 sum += m_ratio.weight(box, k) * (from[k] >> shift & 0xff);
-            result |= static_cast<uint32_t>(sum / kel::divisor(m_ratio.box)) << shift;
+            result |= static_cast<uint32_t>(sum / m_ratio.box) << shift;
         }
         return result;
     }
@@ -134,8 +134,7 @@ public:
             m_weights[k] = static_cast<uint16_t>(m_ratio.weight(box, box.first + k));
         }
         if (m_reduce)
-            return m_reduce(to, m_row.get(), m_weights.get(), m_rows / 2, bytes,
-                            static_cast<uint32_t>(kel::divisor(m_ratio.box)));
+            return m_reduce(to, m_row.get(), m_weights.get(), m_rows / 2, bytes, static_cast<uint32_t>(m_ratio.box));
         for (ptrdiff_t i = 0; i < bytes; ++i) {
             int64_t sum = 0;
             for (kelValue_s32 k = box.first; k <= box.last; ++k)

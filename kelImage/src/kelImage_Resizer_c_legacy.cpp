@@ -13,7 +13,7 @@ kelValue_s32 kel::gcd(kelValue_s32 x, kelValue_s32 y) {
             x = y;
             y = rest;
         } else {
-            y = y % x;
+            y = y % divisor(x);
         }
     }
     return x;

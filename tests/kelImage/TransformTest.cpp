@@ -256,4 +256,10 @@ TEST(Transforms, StopOnTypesAndSizesThatDoNotFit) {
     for (const Image* empty : {&narrow, &flat})
         for (auto resize : {resizeKelImageNearest, resizeKelImageBilinear})
             EXPECT_DIVISION_BY_ZERO(resize(empty->get(), grey.get()));
+    Image four(8, 4, 16), fourNarrow(0, 4, 16), fourFlat(8, 0, 16);
+    for (const Image* empty : {&fourNarrow, &fourFlat}) {
+        EXPECT_DIVISION_BY_ZERO(resizeLinerInterpolation(empty->get(), four.get()));
+        EXPECT_DIVISION_BY_ZERO(zero_order_hold_plus_ave(empty->get(), four.get()));
+        EXPECT_DIVISION_BY_ZERO(zero_order_hold_plus_ave(four.get(), empty->get()));
+    }
 }
