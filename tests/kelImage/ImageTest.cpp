@@ -4,6 +4,7 @@
 #include <malloc.h>
 
 #include "GuardedImage.h"
+#include "TransformReference.h"
 #include "Valgrind.h"
 
 using kel_test::Bytes;
@@ -85,46 +86,22 @@ TEST(ImageRecord, CopiesClonesAndClearsPaddingToo) {
     EXPECT_TRUE(holds(dst, Bytes(dst.size(), 0)));
 }
 
-namespace {
-
-int pixelBytes(int type) {
-    switch (type) {
-    case KEL_PIXEL_TYPE_U8G:
-        return 1;
-    case KEL_PIXEL_TYPE_S16G:
-        return 2;
-    case KEL_PIXEL_TYPE_U8XYZ:
-    case KEL_PIXEL_TYPE_U8ZYX:
-        return 3;
-    case KEL_PIXEL_TYPE_U8XYZA:
-    case KEL_PIXEL_TYPE_U8ZYXA:
-        return 4;
-    default:
-        return 0;
-    }
-}
-
-} // namespace
-
 TEST(ImageData, LoadsAndStoresTheCommonCornerOnly) {
     for (int type = 0; type < 48; ++type)
         for (int width : {-1, 0, 1, 10, 16, 20})
             for (int height : {-1, 0, 1, 4, 8, 10})
                 for (int pitch : {16, 20, 23}) {
                     Image image(16, 8, type);
-                    const int bytes = pixelBytes(type);
-                    Bytes buffer = kel_test::filled(static_cast<size_t>(pitch) * 10 * 4, Fill::Random, 77);
-                    Bytes loaded = image.bytes(), stored = buffer;
-                    for (int y = 0; y < std::min(height, 8); ++y)
-                        for (int i = 0; i < std::min(width, 16) * bytes; ++i) {
-                            stored[y * pitch * bytes + i] = loaded[y * 16 * bytes + i];
-                        }
-                    Bytes out = buffer;
+                    const int bytes = kel_ref::wholePixelBytes(type);
+                    const int columns = std::min(width, 16), rows = std::min(height, 8);
+                    const int pixels = columns > 0 && rows > 0 ? (rows - 1) * pitch + columns : 0; // not one beyond
+                    const Bytes buffer = kel_test::filled(static_cast<size_t>(pixels * bytes), Fill::Random, 77);
+                    Bytes loaded = image.bytes(), stored = buffer, out = buffer;
+                    for (int y = 0; y < rows; ++y)
+                        for (int i = 0; i < columns * bytes; ++i)
+                            std::swap(stored[y * pitch * bytes + i], loaded[y * 16 * bytes + i]);
                     storeKelImageData(out.data(), width, height, pitch, image.get());
                     EXPECT_EQ(out, stored);
-                    for (int y = 0; y < std::min(height, 8); ++y)
-                        for (int i = 0; i < std::min(width, 16) * bytes; ++i)
-                            loaded[y * 16 * bytes + i] = buffer[y * pitch * bytes + i];
                     loadKelImageData(image.get(), buffer.data(), width, height, pitch);
                     EXPECT_TRUE(holds(image, loaded));
                 }

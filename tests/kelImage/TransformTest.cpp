@@ -1,48 +1,30 @@
 // Resizing, borders, flips and warp against plain references, byte for byte, padding and neighbours included.
 #include <cfenv>
 #include <cmath>
-#include <functional>
 #include <limits>
 
-#include "GuardedImage.h"
-#include "ImageOperations.h"
+#include "ImageScene.h"
 #include "Stops.h"
-#include "TransformReference.h"
-#include "Valgrind.h"
 
 namespace {
 
-using kel_test::Bytes;
-using kel_test::Fill;
-using kel_test::Guard;
-using kel_test::Image;
-using kel_test::Size;
-using Operation = std::function<void(kelImage_t*, const kelImage_t*)>;
-
-// Runs an operation and its reference on guarded images, and expects the same destination and an untouched source.
-void compare(const Operation& operation, const Operation& reference, Size dstSize, Size srcSize, int type,
-             Guard guard = Guard::Behind, Fill fill = Fill::Random, size_t extra = 0) {
-    Image src(srcSize.width, srcSize.height, type, guard, extra), dst(dstSize.width, dstSize.height, type, guard),
-        expected(dstSize.width, dstSize.height, type);
-    src.fill(fill, 5);
-    expected.set(dst.bytes());
-    const Bytes source = src.bytes();
-    reference(expected.get(), src.get());
-    operation(dst.get(), src.get());
-    EXPECT_TRUE(holds(dst, expected.bytes())) << "from " << srcSize.width << "x" << srcSize.height;
-    EXPECT_TRUE(holds(src, source));
-}
+using namespace kel_test;
 
 } // namespace
 
 // Beyond the sizes where single precision is exact.
 TEST(Resizing, RoundsThePositionsOfHugeImages) {
     KEL_NOT_UNDER_VALGRIND("it adds only time");
-    compare(resizeKelImageNearest, kel_ref::nearest, {4200000, 1}, {12600001, 1}, 0);
-    compare(resizeKelImageNearest, kel_ref::nearest, {6000000, 1}, {18000001, 1}, 0);
-    compare(resizeKelImageBilinear, kel_ref::bilinear, {4200000, 1}, {12600001, 1}, 0);
-    compare(resizeKelImageBilinear, kel_ref::bilinear, {6000000, 1}, {18000001, 1}, 0);
-    compare(resizeKelImageBilinear, kel_ref::bilinear, {1400001, 1}, {4200004, 3}, 0);
+    const auto resize = [](const char* name, Size dst, Size src) {
+        Setting setting = {src};
+        setting.dst = dst;
+        EXPECT_TRUE(agrees(imageOperation(name), setting));
+    };
+    for (const char* name : {"resizeKelImageNearest 0", "resizeKelImageBilinear 0"}) {
+        resize(name, {4200000, 1}, {12600001, 1});
+        resize(name, {6000000, 1}, {18000001, 1});
+    }
+    resize("resizeKelImageBilinear 0", {1400001, 1}, {4200004, 3});
 }
 
 // The pixel behind the source's last one is read as it is before the destination is written, also where it is the destination's.
@@ -62,17 +44,23 @@ TEST(LinearInterpolation, EnlargesIntoMemoryRightBehindItsSource) {
 }
 
 TEST(ZeroOrderHold, AveragesByAnyRatio) {
-    for (Fill fill : {Fill::Random, Fill::Max})
+    const auto average = [](Size dst, Size src, Fill fill) {
+        Setting setting = {src};
+        setting.dst = dst;
+        setting.fill = fill;
+        EXPECT_TRUE(agrees(imageOperation("zero_order_hold_plus_ave 16"), setting));
+    };
+    for (Fill fill : {Fill::Random, Fill::Max}) {
         for (int from : {3, 17, 33, 64, 97})
             for (int to : {1, 2, 5, 16, 17, 33, 64})
-                if (to <= from)
-                    for (int toRows : {1, 3, 20}) // more rows, too
-                        compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {to, toRows}, {from, 6}, 16,
-                                Guard::Behind, fill);
-    // Boxes too large for the reciprocal.
-    compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 1}, {4099, 2}, 32);
-    compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {3, 1}, {4106, 1}, 32);
-    compare(zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage, {1, 2}, {2, 9001}, 32, Guard::Behind, Fill::Max);
+                for (int toRows : {1, 3, 20}) // more rows, too
+                    if (to <= from)
+                        average({to, toRows}, {from, 6}, fill);
+        // Boxes too large for the reciprocal.
+        average({1, 1}, {4099, 2}, fill);
+        average({3, 1}, {4106, 1}, fill);
+        average({1, 2}, {2, 9001}, fill);
+    }
 }
 
 // The sum of a box does not fit into 32 bits.
@@ -133,13 +121,19 @@ TEST(Warp, SamplesAsTheReferenceDoesForAnyHomography) {
         if (at15 * reciprocal < 15.5f)
             homographies.push_back({w, 0, w / 2, 0, w, w / 2, 0, 0, w});
     }
-    for (const auto& h : homographies)
-        for (int type : {0, 3, 8, 16})
+    for (int type : {0, 3, 8, 16}) {
+        ImageOperation warp = imageOperation("rotateKelImageHomography " + std::to_string(type));
+        for (const auto& h : homographies) {
+            warp.call = [&](const Operands& o) { warpBy(o.dst, o.src, h.data()); };
+            warp.reference = [&](const Operands& o) { kel_ref::warp(o.dst, o.src, h.data()); };
             for (int width : {1, 3, 4, 7, 16, 19, 37})
-                for (Guard guard : {Guard::Behind, Guard::Before})
-                    compare([&](kelImage_t* dst, const kelImage_t* src) { warpBy(dst, src, h.data()); },
-                            [&](kelImage_t* dst, const kelImage_t* src) { kel_ref::warp(dst, src, h.data()); }, {width, 9},
-                            {40 - width, 17}, type, guard);
+                for (Guard guard : {Guard::Behind, Guard::Before}) {
+                    Setting setting = {{40 - width, 17}, 0, guard};
+                    setting.dst = {width, 9};
+                    EXPECT_TRUE(agrees(warp, setting)) << &h - homographies.data();
+                }
+        }
+    }
 }
 
 // An int holds no index of the last pixels. Nothing but the pixels touched is ever in memory.
@@ -168,16 +162,6 @@ TEST(Warp, ComputesNoColumnBehindTheLast) {
     EXPECT_FALSE(std::fetestexcept(FE_DIVBYZERO));
 }
 
-TEST(Warp, FillsWithZeroFromAnEmptySource) {
-    Image src(0, 0, 0), dst(20, 3, 0);
-    const float identity[9] = {1, 0, 0, 0, 1, 0, 0, 0, 1};
-    Bytes expected = dst.bytes();
-    for (int y = 0; y < 3; ++y)
-        std::fill_n(expected.begin() + 32 * y, 20, 0);
-    warpBy(dst.get(), src.get(), identity);
-    EXPECT_TRUE(holds(dst, expected));
-}
-
 // A destination of more than 2^31 bytes says a size that has wrapped.
 TEST(Border, OfWordsReachesAsFarAsRowsAndStepSay) {
     Image src(16, 3, 3), dst(18, 5, 3), expected(18, 5, 3);
@@ -203,55 +187,9 @@ TEST(Transforms, WriteNothingForNegativeWidths) {
     }
 }
 
-TEST(Transforms, StopOnTypesAndSizesThatDoNotFit) {
-    const char *const resizer = "kelImage/src/kelImage_Resizer_c_legacy.cpp",
-                      *const rotater = "kelImage/src/kelImage_Rotater_c_legacy.cpp", *const sameType = "dst->type == src->type";
-    Image grey(20, 10, 0), wide(21, 10, 0), tall(20, 11, 0), colour(20, 10, 8), odd(20, 10, 7), oddWide(21, 10, 7);
-    const struct {
-        const char *name, *file, *text;
-        std::function<void(kelImage_t*, const kelImage_t*)> call;
-        Image *dst, *src;
-    } cases[] = {
-        {"resizeKelImage(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImage, &grey, &colour},
-        {"resizeKelImageNearest(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImageNearest, &grey, &colour},
-        {"resizeKelImageBilinear(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImageBilinear, &colour, &grey},
-        {"resizeKelImageHalf(kelImage_t*, const kelImage_t*)", resizer, sameType, resizeKelImageHalf, &grey, &colour},
-        {"resizeKelImageHalf(kelImage_t*, const kelImage_t*)", resizer, "dst->width == src->width / 2", resizeKelImageHalf,
-         &grey, &grey},
-        {"resizeKelImageEnborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer, sameType,
-         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageEnborder(d, s, 0); }, &grey, &colour},
-        {"resizeKelImageEnborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer,
-         "dst->width == src->width +2*size && dst->height == src->height + 2*size",
-         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageEnborder(d, s, 0); }, &odd, &oddWide},
-        {"resizeKelImageEnborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer,
-         "dst->width == src->width +2*size && dst->height == src->height + 2*size",
-         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageEnborder(d, s, 0); }, &grey, &tall},
-        {"resizeKelImageDeborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer, sameType,
-         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageDeborder(d, s, 0); }, &grey, &colour},
-        {"resizeKelImageDeborder(kelImage_t*, const kelImage_t*, kelValue_s32)", resizer,
-         "dst->width == src->width - 2*size && dst->height == src->height - 2*size",
-         [](kelImage_t* d, const kelImage_t* s) { resizeKelImageDeborder(d, s, 1); }, &grey, &wide},
-        {"rotateKelImageH(kelImage_t*, const kelImage_t*)", rotater, sameType, rotateKelImageH, &grey, &colour},
-        {"rotateKelImageV(kelImage_t*, const kelImage_t*)", rotater, sameType, rotateKelImageV, &grey, &colour},
-        {"rotateKelImageVH(kelImage_t*, const kelImage_t*)", rotater, sameType, rotateKelImageVH, &grey, &colour},
-        {"rotateKelImageH(kelImage_t*, const kelImage_t*)", rotater, "dst->width == src->width && dst->height == src->height",
-         rotateKelImageH, &grey, &wide},
-        {"rotateKelImageV(kelImage_t*, const kelImage_t*)", rotater, "dst->width == src->width && dst->height == src->height",
-         rotateKelImageV, &grey, &tall},
-        {"rotateKelImageVH(kelImage_t*, const kelImage_t*)", rotater, "dst->width == src->width && dst->height == src->height",
-         rotateKelImageVH, &odd, &oddWide},
-        {"rotateKelImageHomography(kelImage_t*, const kelImage_t*, float, float, float, float, float, float, float, float, "
-         "float)",
-         rotater, sameType,
-         [](kelImage_t* d, const kelImage_t* s) { rotateKelImageHomography(d, s, 1, 0, 0, 0, 1, 0, 0, 0, 1); }, &grey, &colour},
-    };
-    for (const auto& c : cases)
-        EXPECT_STOPS(c.call(c.dst->get(), c.src->get()), c.text, c.file, std::string("void ") + c.name);
-    Image half(10, 6, 0);
-    EXPECT_STOPS(resizeKelImageHalf(half.get(), grey.get()), "dst->height == src->height / 2", resizer,
-                 "void resizeKelImageHalf(kelImage_t*, const kelImage_t*)");
-    // An empty destination divides by zero, whether the ratio is needed or not; in the bilinear form before the check.
-    Image none(0, 4, 8), narrow(0, 4, 0), flat(20, 0, 0);
+// Whether the ratio is needed or not; in the bilinear form before the check of types.
+TEST(Transforms, DivideByZeroForEmptyDestinations) {
+    Image grey(20, 10, 0), none(0, 4, 8), narrow(0, 4, 0), flat(20, 0, 0);
     EXPECT_DIVISION_BY_ZERO(resizeKelImageBilinear(none.get(), grey.get()));
     for (const Image* empty : {&narrow, &flat})
         for (auto resize : {resizeKelImageNearest, resizeKelImageBilinear})

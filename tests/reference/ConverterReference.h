@@ -51,24 +51,16 @@ inline void U8XYZ_to_U8G(kelImage_t* dst, const kelImage_t* src) {
 inline void U8XYZ_to_S16G(kelImage_t* dst, const kelImage_t* src) {
     perPixel<2, 3>(dst, src, [](uint8_t* d, const uint8_t* s) { putShort(d, mean(s)); });
 }
-inline void U8XYZ_to_U8ZYX(kelImage_t* dst, const kelImage_t* src) {
-    perPixel<3, 3>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = s[2], d[1] = s[1], d[2] = s[0]; });
+// Bytes `from` of each pixel of S, -1 for 0.
+template <int S, int... from> void picked(kelImage_t* dst, const kelImage_t* src) {
+    perPixel<sizeof...(from), S>(dst, src, [](uint8_t* d, const uint8_t* s) { ((*d++ = from < 0 ? 0 : s[from]), ...); });
 }
-inline void U8XYZ_to_U8XYZA(kelImage_t* dst, const kelImage_t* src) {
-    perPixel<4, 3>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = s[0], d[1] = s[1], d[2] = s[2], d[3] = 0; });
-}
-inline void U8XYZ_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src) {
-    perPixel<4, 3>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = s[2], d[1] = s[1], d[2] = s[0], d[3] = 0; });
-}
-inline void U8XYZA_to_U8XYZ(kelImage_t* dst, const kelImage_t* src) {
-    perPixel<3, 4>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = s[0], d[1] = s[1], d[2] = s[2]; });
-}
-inline void U8XYZA_to_U8ZYX(kelImage_t* dst, const kelImage_t* src) {
-    perPixel<3, 4>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = s[2], d[1] = s[1], d[2] = s[0]; });
-}
-inline void U8XYZA_to_U8ZYXA(kelImage_t* dst, const kelImage_t* src) {
-    perPixel<4, 4>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = s[2], d[1] = s[1], d[2] = s[0], d[3] = s[3]; });
-}
+constexpr auto U8XYZ_to_U8ZYX = picked<3, 2, 1, 0>;
+constexpr auto U8XYZ_to_U8XYZA = picked<3, 0, 1, 2, -1>;
+constexpr auto U8XYZ_to_U8ZYXA = picked<3, 2, 1, 0, -1>;
+constexpr auto U8XYZA_to_U8XYZ = picked<4, 0, 1, 2>;
+constexpr auto U8XYZA_to_U8ZYX = picked<4, 2, 1, 0>;
+constexpr auto U8XYZA_to_U8ZYXA = picked<4, 2, 1, 0, 3>;
 // Misplaced: as if the grey destination had three channels.
 inline void U8XYZA_to_U8G(kelImage_t* dst, const kelImage_t* src) {
     perPixel<3, 4>(dst, src, [](uint8_t* d, const uint8_t* s) { d[0] = static_cast<uint8_t>(mean(s)); });
@@ -112,12 +104,8 @@ template <bool blueFirst> void yuvToThree(kelImage_t* dst, const kelImage_t* src
             }
         }
 }
-inline void U8YUV_to_U8RGB(kelImage_t* dst, const kelImage_t* src) {
-    yuvToThree<false>(dst, src);
-}
-inline void U8YUV_to_U8BGR(kelImage_t* dst, const kelImage_t* src) {
-    yuvToThree<true>(dst, src);
-}
+constexpr auto U8YUV_to_U8RGB = yuvToThree<false>;
+constexpr auto U8YUV_to_U8BGR = yuvToThree<true>;
 
 // ---- Vector converters: blocks of N pixels in one run through both areas; body(d, s) for each pair of pixels.
 
@@ -157,12 +145,8 @@ template <bool blueFirst> void yuvToFour(kelImage_t* dst, const kelImage_t* src)
         }
     });
 }
-inline void U8YUV_to_U8RGBA(kelImage_t* dst, const kelImage_t* src) {
-    yuvToFour<false>(dst, src);
-}
-inline void U8YUV_to_U8BGRA(kelImage_t* dst, const kelImage_t* src) {
-    yuvToFour<true>(dst, src);
-}
+constexpr auto U8YUV_to_U8RGBA = yuvToFour<false>;
+constexpr auto U8YUV_to_U8BGRA = yuvToFour<true>;
 
 inline void nothing(kelImage_t*, const kelImage_t*) {}
 

@@ -93,7 +93,7 @@ inline void sobel(kelImage_t* dst, kelImage_t* src) {
 }
 
 inline void rank(kelImage_t* dst, kelImage_t* src, int n) {
-    for (int y = 0; y < src->height; ++y)
+    for (int y = 0; n >= 1 && y < src->height; ++y)
         for (int x = 0; x < src->width; ++x) {
             u8(dst, x, y) = 0;
             if (x < n || x + n >= src->width || y < n || y + n >= src->height)

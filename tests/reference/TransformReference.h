@@ -14,20 +14,7 @@ namespace kel_ref {
 
 // Bytes of a pixel that is moved as a whole; 0 for the types that are ignored.
 inline int wholePixelBytes(int type) {
-    switch (type) {
-    case 0:
-        return 1;
-    case 3:
-        return 2;
-    case 8:
-    case 24:
-        return 3;
-    case 16:
-    case 32:
-        return 4;
-    default:
-        return 0;
-    }
+    return type == 0 ? 1 : type == 3 ? 2 : type == 8 || type == 24 ? 3 : type == 16 || type == 32 ? 4 : 0;
 }
 
 inline void copyPixel(kelImage_t* dst, ptrdiff_t to, const kelImage_t* src, ptrdiff_t from) {

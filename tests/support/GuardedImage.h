@@ -24,42 +24,31 @@ enum class Fill { Random, Zero, Max, Alternating, Ramp, Runs, Extremes };
 constexpr Fill kFills[] = {Fill::Random, Fill::Zero, Fill::Max, Fill::Alternating, Fill::Ramp, Fill::Runs, Fill::Extremes};
 
 inline Bytes filled(size_t bytes, Fill fill, uint32_t salt) {
+    // as 16 bits: -32768, -1, 0, 32767, and neighbours
+    static const uint8_t extremes[] = {0x00, 0x80, 0xff, 0xff, 0x00, 0x00, 0xff, 0x7f, 0x01, 0x80, 0x7f, 0x00, 0x80, 0x00};
     Bytes result(bytes);
     std::mt19937 random = generator(salt);
-    uint8_t run = 0;
-    uint32_t bits = 0;
-    for (size_t i = 0; i < bytes; ++i) {
+    uint32_t run = 0, bits = 0;
+    const auto next = [&](size_t i) -> uint32_t {
         switch (fill) {
-        case Fill::Random:
-            if (i % 4 == 0)
-                bits = random();
-            result[i] = static_cast<uint8_t>(bits >> 8 * (i % 4));
-            break;
         case Fill::Zero:
-            result[i] = 0;
-            break;
+            return 0;
         case Fill::Max:
-            result[i] = 255;
-            break;
+            return 255;
         case Fill::Alternating:
-            result[i] = i % 2 ? 255 : 0;
-            break;
+            return i % 2 ? 255 : 0;
         case Fill::Ramp:
-            result[i] = static_cast<uint8_t>(i * 3);
-            break;
+            return static_cast<uint32_t>(i * 3);
         case Fill::Runs:
-            if (random() % 8 == 0)
-                run = static_cast<uint8_t>(random());
-            result[i] = run;
-            break;
-        case Fill::Extremes: { // as 16 bits: -32768, -1, 0, 32767, and neighbours
-            static const uint8_t values[] = {0x00, 0x80, 0xff, 0xff, 0x00, 0x00, 0xff,
-                                             0x7f, 0x01, 0x80, 0x7f, 0x00, 0x80, 0x00};
-            result[i] = values[(random() % 7) * 2 + i % 2];
-            break;
+            return run = random() % 8 == 0 ? random() : run;
+        case Fill::Extremes:
+            return extremes[(random() % 7) * 2 + i % 2];
+        default:
+            return (bits = i % 4 == 0 ? random() : bits) >> 8 * (i % 4);
         }
-        }
-    }
+    };
+    for (size_t i = 0; i < bytes; ++i)
+        result[i] = static_cast<uint8_t>(next(i));
     return result;
 }
 

@@ -177,12 +177,14 @@ void addFilters(List& list) {
     const auto add = [&](const char* name, int to, ImageCall call, ImageCall reference) -> ImageOperation& {
         list.push_back(operation(name, kGrey, to, std::move(call), std::move(reference)));
         list.back().heights = kAllHeights;
+        list.back().byType = true;
         return list.back();
     };
     for (const bool sse : {false, true}) {
-        add(sse ? "applyKelFilterLaplacianSSE3X3" : "applyKelFilterLaplacian3X3", kWords,
-            filter(sse ? applyKelFilterLaplacianSSE3X3 : applyKelFilterLaplacian3X3), filter(kel_ref::cross))
-            .settled = {8, 5, 5, 5};
+        ImageOperation& cross =
+            add(sse ? "applyKelFilterLaplacianSSE3X3" : "applyKelFilterLaplacian3X3", kWords,
+                filter(sse ? applyKelFilterLaplacianSSE3X3 : applyKelFilterLaplacian3X3), filter(kel_ref::cross));
+        cross.settled = {8, 5, 5, 5};
         ImageOperation& sobel = add(sse ? "applyKelFilterSobelSSE3X3" : "applyKelFilterSobel3X3", kWords,
                                     filter(sse ? applyKelFilterSobelSSE3X3 : applyKelFilterSobel3X3), filter(kel_ref::sobel));
         sobel.settled = {16, 16, 1, 1};
@@ -190,14 +192,14 @@ void addFilters(List& list) {
     }
     ImageOperation& rank = add("applyKelFilterMedianNXN", kGrey, withParameter(applyKelFilterMedianNXN),
                                [](const Operands& o) { kel_ref::rank(o.dst, o.src, std::min(o.parameter, 1 << 20)); });
-    rank.parameters = {1, 2, 3, 40, 1 << 30};
+    rank.parameters = {1, 2, 3, 40, 1 << 30, 0, -1};
     rank.heights = {0, 1, 3, 6, 7, 12};
     add("applyKelFilterMedian3X3", kGrey, filter(applyKelFilterMedian3X3), pair(kel_ref::nothing)).settledWidth = 0;
     ImageOperation& noise =
         add("applyKelFilterNoise", kGrey, withParameter(applyKelFilterNoise), withParameter(kel_ref::noise));
     noise.parameters = {10, 0, 1, 255, 100000, -1, -7, INT_MAX, INT_MIN};
     noise.heights = {0, 1, 2, 9};
-    noise.inPlace = noise.draws = noise.byType = true;
+    noise.inPlace = noise.draws = true;
 }
 
 void addTransforms(List& list) {
@@ -295,6 +297,11 @@ const std::vector<ImageOperation>& imageOperations() {
         return result;
     }();
     return list;
+}
+
+const ImageOperation& imageOperation(const std::string& name) {
+    const List& all = imageOperations();
+    return *std::find_if(all.begin(), all.end(), [&](const ImageOperation& o) { return o.name == name; });
 }
 
 size_t roomFor(const ImageOperation& operation, Size dst) {

@@ -49,9 +49,12 @@ struct ImageOperation {
         int left = 0, right = 0, top = 0, bottom = 0;
     } settled;             // margins within which the destination is written from pixels alone, not from padding
     int settledWidth = 61; // of a source for that to hold
+
+    std::string function() const { return name.substr(0, name.find(' ')); }
 };
 
 const std::vector<ImageOperation>& imageOperations();
+const ImageOperation& imageOperation(const std::string& name);
 
 // Bytes of the destination's data area.
 size_t roomFor(const ImageOperation& operation, Size dst);

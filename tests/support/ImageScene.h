@@ -2,7 +2,9 @@
 #ifndef KEL_TESTS_IMAGE_SCENE_H
 #define KEL_TESTS_IMAGE_SCENE_H
 
+#include <cfenv>
 #include <climits>
+#include <cstdlib>
 #include <optional>
 
 #include "GuardedImage.h"
@@ -24,6 +26,7 @@ struct Setting {
     Size dst = {INT_MIN, 0}; // where it is not what the operation makes of the source's
     ptrdiff_t spare = 0;     // bytes behind the data; negative where rows end with their last pixel
     Size scratch = {0, 0};   // columns and rows that the scratch image has more than the source
+    size_t behindScratch = 0;
 };
 
 inline std::ostream& operator<<(std::ostream& out, const Setting& s) {
@@ -31,17 +34,26 @@ inline std::ostream& operator<<(std::ostream& out, const Setting& s) {
                << (s.inPlace ? ", in place" : "") << (s.half < 0 ? "" : ", with half");
 }
 
+inline Size sizeOfDst(const ImageOperation& o, const Setting& s) {
+    return s.dst.width == INT_MIN ? o.size(s.src, s.parameter) : s.dst;
+}
+inline bool isDefined(const ImageOperation& o, const Setting& s) {
+    const Size dst = sizeOfDst(o, s);
+    return std::min(s.src.width, dst.width) >= o.leastWidth && dst.height >= 0;
+}
+
 // The images of a call, the same contents every time.
 class Scene {
 public:
-    Scene(const ImageOperation& o, const Setting& s, int type)
+    Scene(const ImageOperation& o, const Setting& s, int type) : Scene(o, s, type, sizeOfDst(o, s)) {}
+    Scene(const ImageOperation& o, const Setting& s, int type, Size dst)
         : m_operation(o), m_setting(s), m_src(s.src.width, s.src.height, type, s.guard, o.behind + spare(s.src.width, type)),
-          m_dst(dstSize().width, dstSize().height, type == o.from ? o.to : type, s.guard,
-                extra() + spare(dstSize().width, o.to)) {
+          m_dst(dst.width, dst.height, type == o.from ? o.to : type, s.guard,
+                roomFor(o, dst) / o.room * (o.room - 1) + spare(dst.width, o.to)) {
         if (s.fill != Fill::Random)
             m_src.fill(s.fill, 5);
         if (o.tmp != kNoType)
-            m_tmp.emplace(s.src.width + s.scratch.width, s.src.height + s.scratch.height, o.tmp, s.guard);
+            m_tmp.emplace(s.src.width + s.scratch.width, s.src.height + s.scratch.height, o.tmp, s.guard, s.behindScratch);
         if (s.half >= 0)
             m_half.emplace((std::max(s.src.width, 0) + 1) / 2 + s.half, (s.src.height + 1) / 2, 0, s.guard);
     }
@@ -88,21 +100,34 @@ public:
     }
 
 private:
-    Size dstSize() const {
-        return m_setting.dst.width == INT_MIN ? m_operation.size(m_setting.src, m_setting.parameter) : m_setting.dst;
-    }
     size_t spare(int width, int type) const {
         if (m_setting.spare >= 0)
             return static_cast<size_t>(m_setting.spare);
         return size_t(0) - static_cast<size_t>((kel_ref::wholeBlocks(width) - width) * kel_ref::wholePixelBytes(type));
     }
-    size_t extra() const { return roomFor(m_operation, dstSize()) / m_operation.room * (m_operation.room - 1); }
 
     const ImageOperation& m_operation;
     const Setting m_setting;
     Image m_src, m_dst;
     std::optional<Image> m_tmp, m_half;
 };
+
+// Whether an operation and its reference make the same of the same images, and draw as often, where they are defined for them.
+inline testing::AssertionResult agrees(const ImageOperation& o, const Setting& setting, int rounding = FE_TONEAREST) {
+    if (!isDefined(o, setting))
+        return testing::AssertionSuccess();
+    const Scene actual(o, setting, o.from), expected(o, setting, o.from);
+    std::fesetround(rounding);
+    srand(42);
+    expected.apply(o.reference);
+    const int next = rand();
+    srand(42);
+    actual.apply(o.call);
+    std::fesetround(FE_TONEAREST);
+    if (rand() != next)
+        return testing::AssertionFailure() << "another number of draws, " << setting;
+    return actual.equals(expected) << ", " << setting;
+}
 
 } // namespace kel_test
 
