@@ -1,9 +1,10 @@
-// Prints a digest of every operation of the lists and of registrations of the demo's scenes, one a line. The bytes are the same on
+// Prints a digest of every function of the lists and of registrations of the demo's scenes, one a line. The bytes are the same on
 // every processor and with the kernels of every instruction set: what it printed once is kept beside it.
 #include <cfenv>
 #include <cstdio>
 #include <cstdlib>
 #include <kel/kelRegister.h>
+#include <map>
 
 #include "ImageScene.h"
 #include "MatInputs.h"
@@ -53,16 +54,14 @@ Setting settingOf(const ImageOperation& o, Size src, size_t round) {
     return s;
 }
 
-void digest(const ImageOperation& o) {
-    Digest digest;
+void add(Digest& digest, const ImageOperation& o) {
     size_t round = 0;
     for (int seed : kSeeds)
         for (int width : widths())
             for (size_t i = 0; i < std::min<size_t>(o.heights.size(), 5); ++i) {
                 ++round;
                 const Setting s = settingOf(o, {width, o.heights[round % o.heights.size()]}, round);
-                const Size dst = o.size(s.src, s.parameter);
-                if (std::min(width, dst.width) < o.leastWidth || dst.height < 0 || round % static_cast<size_t>(o.stride) != 0)
+                if (!isDefined(o, s) || round % static_cast<size_t>(o.stride) != 0)
                     continue;
                 setSeed(seed);
                 const Scene scene(o, s, o.from);
@@ -72,7 +71,6 @@ void digest(const ImageOperation& o) {
                 scene.forEach([&](const Image& image) { digest.add(image); });
                 digest.add(rand());
             }
-    digest.print(o.name);
 }
 
 void digest(const MatOperation& o) {
@@ -131,8 +129,11 @@ void digestRegistration(unsigned seed) {
 } // namespace
 
 int main() {
+    std::map<std::string, Digest> ofFunctions; // whatever types each takes
     for (const ImageOperation& o : imageOperations())
-        digest(o);
+        add(ofFunctions[o.function()], o);
+    for (const auto& [function, digest] : ofFunctions)
+        digest.print(function);
     for (const MatOperation& o : matOperations())
         digest(o);
     digestTurns();
