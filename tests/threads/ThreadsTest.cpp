@@ -8,7 +8,7 @@
 #include <thread>
 #include <vector>
 
-#include "ImageOperations.h"
+#include "ImageScene.h"
 #include "MatOperations.h"
 #include "Random.h"
 #include "Warps.h"
@@ -19,22 +19,14 @@ using namespace kel_test;
 
 using Result = std::vector<unsigned char>;
 
-// With known bytes, padding and the room behind included.
-kel::Image noise(Size size, int type, size_t extra, uint32_t salt) {
-    kel::Image image = imageWithRoom(size, type, extra);
-    std::mt19937 random = generator(salt);
-    std::generate_n(image->data, static_cast<size_t>(image->size) + extra,
-                    [&] { return static_cast<unsigned char>(random()); });
-    return image;
-}
-
 Result resultOf(const ImageOperation& o) {
-    const Size src = {64, 48}, dst = o.size(src, o.parameters[0]);
-    const size_t room = roomFor(o, dst), spare = room / o.room * (o.room - 1);
-    kel::Image from = noise(src, o.from, o.behind, 1), to = noise(dst, o.to, spare, 2),
-               tmp = noise(src, std::max(o.tmp, 0), 0, 3), half = noise({48, 24}, 0, 0, 4);
-    o.call({to.get(), from.get(), tmp.get(), o.half ? half.get() : nullptr, o.parameters[0]});
-    return o.draws ? Result() : Result(to->data, to->data + room); // draws from rand() are shared out among the threads
+    Setting setting = {{64, 48}, o.parameters[0]};
+    setting.half = o.half ? 16 : -1;
+    const Scene images(o, setting, o.from);
+    images.apply(o.call);
+    Result bytes;
+    images.forEach([&](const Image& image) { bytes.insert(bytes.end(), image.data(), image.data() + image.size()); });
+    return o.draws ? Result() : bytes; // draws from rand() are shared out among the threads
 }
 
 Result resultOf(const MatOperation& o) {
@@ -51,7 +43,7 @@ Result resultOf(const MatOperation& o) {
 }
 
 Result resultOfKeypoints() {
-    kel::Image grey = noise({64, 48}, KEL_PIXEL_TYPE_U8G, 0, 6), response = noise({64, 48}, KEL_PIXEL_TYPE_S16G, 0, 7);
+    const Image grey(64, 48, KEL_PIXEL_TYPE_U8G), response(64, 48, KEL_PIXEL_TYPE_S16G);
     kelKeypoint2DF32_t keypoints[200];
     const int count = applyKelDetectorKeypointYape(keypoints, 200, grey.get(), response.get());
     Result bytes(static_cast<size_t>(count) * sizeof keypoints[0]);
