@@ -3,7 +3,6 @@
 #include <cstring>
 #include <kel/kelImage.h>
 
-#include "ConverterReference.h"
 #include "Fuzz.h"
 #include "ImageOperations.h"
 #include "TransformReference.h"
@@ -51,17 +50,6 @@ void operation(Input& input) {
         images->expectEqual(o.name.c_str());
 }
 
-// Types that do not go together, and those that are not processed.
-void conversion(Input& input) {
-    const int width = someSize(input), height = input.between(0, 9);
-    Twins src(input, width, height, someType(input)), dst(input, width, height, someType(input), 4096);
-    if ((src.lib->type == 16 || src.lib->type == 32) && (dst.lib->type == 0 || dst.lib->type == 3))
-        return; // needs room, and is in the list
-    convertKelImage(dst.lib.get(), src.lib.get());
-    kel_ref::convert(dst.ref.get(), src.ref.get());
-    dst.expectEqual("convertKelImage");
-}
-
 void keypoints(Input& input) {
     const int width = input.between(0, 90), height = input.between(0, 60), max = input.between(0, 200);
     Twins grey(input, width, height, 0), response(input, width, height, 3);
@@ -91,37 +79,11 @@ void warp(Input& input) {
     dst.expectEqual("rotateKelImageHomography");
 }
 
-void transfer(Input& input) {
-    const int width = someSize(input), height = input.between(0, 9), type = kTypes[input.byte() % 6]; // not YUV: copies nothing
-    const int w = input.between(-1, 90), h = input.between(-1, 12), pitch = std::max(w, 0) + input.between(0, 5);
-    const size_t bytes = static_cast<size_t>(kel_ref::wholePixelBytes(type));
-    Twins image(input, width, height, type);
-    std::vector<uint8_t> buffer(static_cast<size_t>(pitch * std::max(h, 0)) * bytes), before;
-    input.fill(buffer.data(), buffer.size());
-    before = buffer;
-    const auto forEachPixel = [&](auto body) { // of those that both have
-        for (int y = 0; y < std::min(h, height); ++y)
-            for (int x = 0; x < std::min(w, width); ++x)
-                body(before.data() + static_cast<size_t>(y * pitch + x) * bytes,
-                     image.ref->data + static_cast<size_t>(y * image.ref->step + x) * bytes);
-    };
-    if (input.byte() % 2) {
-        loadKelImageData(image.lib.get(), buffer.data(), w, h, pitch);
-        forEachPixel([&](uint8_t* outside, uint8_t* inside) { std::memcpy(inside, outside, bytes); });
-    } else {
-        storeKelImageData(buffer.data(), w, h, pitch, image.lib.get());
-        forEachPixel([&](uint8_t* outside, uint8_t* inside) { std::memcpy(outside, inside, bytes); });
-    }
-    image.expectEqual("loadKelImageData");
-    if (buffer != before)
-        kel_fuzz::fail("storeKelImageData");
-}
-
 } // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     Input input(data, size);
-    void (*const targets[])(Input&) = {operation, operation, operation, operation, conversion, keypoints, warp, transfer};
+    void (*const targets[])(Input&) = {operation, operation, operation, operation, keypoints, warp};
     targets[input.byte() % (sizeof targets / sizeof *targets)](input);
     return 0;
 }
