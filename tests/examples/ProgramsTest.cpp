@@ -1,24 +1,26 @@
 // The example programs, run as a user runs them: pictures of every format, bad input of every kind, videos, equal seeds.
 #include <cmath>
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <fstream>
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
-#include <jpeglib.h>
 #include <sstream>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
 
+#include "Warps.h"
 #include "common/Scene.h"
 
 namespace {
 
 namespace fs = std::filesystem;
 using namespace kel_examples;
+using kel_test::meanError;
+using kel_test::Plane;
+using kel_test::planeOf;
 using testing::HasSubstr;
 
 std::string contents(const fs::path& path) {
@@ -56,71 +58,37 @@ protected:
         std::ofstream(path(name), std::ios::binary) << bytes;
     }
 
-    // Binary PPM, or PGM of the mean of the channels.
-    void writePnm(const std::string& name, const Image& picture, bool colour) const {
-        std::string bytes = (colour ? "P6\n# a comment\n" : "P5 ") + std::to_string(picture->width) + " " +
-                            std::to_string(picture->height) + "\n255\n";
+    // Binary PPM or PGM; `magic` ends with white space.
+    void writePnm(const std::string& name, const std::string& magic, const Image& picture) const {
+        std::string bytes = magic + std::to_string(picture->width) + " " + std::to_string(picture->height) + "\n255\n";
         for (int y = 0; y < picture->height; ++y)
-            for (int x = 0; x < picture->width; ++x) {
-                const unsigned char* const p = picture->data + 3 * (y * picture->step + x);
-                if (colour)
-                    bytes.append(reinterpret_cast<const char*>(p), 3);
-                else
-                    bytes += static_cast<char>((p[0] + p[1] + p[2]) / 3);
-            }
+            bytes.append(reinterpret_cast<const char*>(picture.row(y)), picture.rowBytes());
         write(name, bytes);
     }
+    void writeJpeg(const std::string& name, const Image& picture) const {
+        const std::vector<uint8_t> bytes = encodeJpeg(picture);
+        write(name, std::string(bytes.begin(), bytes.end()));
+    }
 
-    // In the printing colours the bytes stand for something else, which does not matter here.
-    void writeJpeg(const std::string& name, const Image& picture, bool cmyk = false) const {
-        jpeg_compress_struct jpeg;
-        jpeg_error_mgr errors;
-        jpeg.err = jpeg_std_error(&errors);
-        jpeg_create_compress(&jpeg);
-        std::FILE* const file = std::fopen(path(name).c_str(), "wb");
-        jpeg_stdio_dest(&jpeg, file);
-        jpeg.image_width = static_cast<JDIMENSION>(cmyk ? picture->width / 2 : picture->width);
-        jpeg.image_height = static_cast<JDIMENSION>(picture->height);
-        jpeg.input_components = cmyk ? 4 : 3;
-        jpeg.in_color_space = cmyk ? JCS_CMYK : JCS_RGB;
-        jpeg_set_defaults(&jpeg);
-        jpeg_set_quality(&jpeg, 90, TRUE);
-        jpeg_start_compress(&jpeg, TRUE);
-        while (jpeg.next_scanline < jpeg.image_height) {
-            JSAMPROW row = picture->data + size_t(3) * picture->step * jpeg.next_scanline;
-            jpeg_write_scanlines(&jpeg, &row, 1);
-        }
-        jpeg_finish_compress(&jpeg);
-        jpeg_destroy_compress(&jpeg);
-        std::fclose(file);
+    // A refusal in one line that holds `text`, nothing else, and no file.
+    void expectRefusal(const std::string& program, const std::string& arguments, const std::string& text) const {
+        const Outcome result = run(program, arguments);
+        EXPECT_EQ(result.status, 1) << arguments;
+        EXPECT_EQ(result.out, "") << arguments;
+        EXPECT_THAT(result.err, HasSubstr(text)) << arguments;
+        EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
+        EXPECT_FALSE(fs::exists(path("kel-out")) || fs::exists(path("out"))) << arguments;
     }
 
     fs::path m_folder;
 };
 
-kelMat homographyIn(const std::string& out) {
-    kelMat H(3, 3, true);
-    std::istringstream in(out);
-    for (int i = 0; i < 9; ++i)
-        in >> H.m_Data[i];
+Plane homographyIn(const std::string& text) {
+    Plane H = {};
+    std::istringstream in(text);
+    for (double& value : H.m)
+        in >> value;
     return H;
-}
-
-// Mean distance in pixels over the part of the first picture that the second shows.
-double meanError(kelMat H, kelMat truth, int width, int height) {
-    double sum = 0;
-    int count = 0;
-    for (float y = 0; y < static_cast<float>(height); y += 16)
-        for (float x = 0; x < static_cast<float>(width); x += 16) {
-            float u, v, s, t;
-            truth.cvtPoint(x, y, &u, &v);
-            H.cvtPoint(x, y, &s, &t);
-            if (u >= 0 && v >= 0 && u < static_cast<float>(width) && v < static_cast<float>(height)) {
-                sum += std::hypot(u - s, v - t);
-                ++count;
-            }
-        }
-    return sum / count;
 }
 
 std::string firstLine(const std::string& text) {
@@ -194,14 +162,14 @@ TEST_F(Programs, PicturesAreTurnedAsTheirExifOrientationSays) {
 
 TEST_F(Programs, RegisterReadsEveryFormat) {
     const Scene scene = renderScene(7);
-    writePnm("a.ppm", scene.first, true);
-    writePnm("a.pgm", scene.first, false);
+    writePnm("a.ppm", "P6\n# a comment\n", scene.first);
+    writePnm("a.pgm", "P5 ", greyOf(scene.first));
     writeJpeg("a.jpg", scene.first);
     writePicture(path("b.png"), scene.second);
     for (const char* name : {"a.ppm", "a.pgm", "a.jpg"}) {
         const Outcome result = run("register", std::string(name) + " b.png --output pictures");
         EXPECT_EQ(result.status, 0) << name << result.err;
-        EXPECT_LT(meanError(homographyIn(result.out), scene.H, 640, 480), 0.7) << name;
+        EXPECT_LT(meanError(homographyIn(result.out), planeOf(scene.H), scene.first.get(), scene.second.get()), 0.7) << name;
     }
     EXPECT_TRUE(fs::exists(path("pictures/mosaic.png")));
 }
@@ -228,14 +196,17 @@ TEST_F(Programs, RegisterSaysWhereThereIsNoHomography) {
     }
 }
 
-TEST_F(Programs, RegisterAnswersBadInputWithOneLineAndWritesNothing) {
+TEST_F(Programs, RegisterRefusesInOneLineAndWritesNothing) {
     const Scene scene = renderScene(3);
     writePicture(path("good.png"), scene.first);
     writeJpeg("good.jpg", scene.first);
-    writeJpeg("cmyk.jpg", scene.first, true);
-    writePnm("good.ppm", scene.first, true);
+    writePnm("good.ppm", "P6\n", scene.first);
     for (const char* name : {"good.png", "good.jpg", "good.ppm"})
         write(std::string("cut-") + name, contents(path(name)).substr(0, 5000));
+    static const char cmyk[] =
+        "\xff\xd8\xff\xc0\0\x14\x08\0\x08\0\x08\4\1\x11\0\2\x11\0\3\x11\0\4\x11\0" // frame of 8x8, four colours
+        "\xff\xda\0\x0e\4\1\0\2\0\3\0\4\0\0\x3f\0";                                // and its scan
+    write("cmyk.jpg", std::string(cmyk, sizeof cmyk));
     write("text.png", "hello\n");
     write("empty.png", "");
     write("zero.pgm", "P5\n0 5\n255\n");
@@ -244,9 +215,7 @@ TEST_F(Programs, RegisterAnswersBadInputWithOneLineAndWritesNothing) {
     write("deep.pgm", "P5\n2 2\n65535\n" + std::string(8, 'x'));
     write("header.pgm", "P5\n2 x\n255\nabcd");
     fs::create_directory(path("folder"));
-    const struct {
-        const char *arguments, *text;
-    } cases[] = {
+    const std::pair<const char*, const char*> cases[] = {
         {"missing.png good.png", "missing.png"},
         {"good.png missing.png", "missing.png"},
         {"cut-good.png good.png", "cut-good.png"},
@@ -271,14 +240,8 @@ TEST_F(Programs, RegisterAnswersBadInputWithOneLineAndWritesNothing) {
         {"good.png good.png --output text.png", "text.png"},
         {"good.png good.png --output /proc/nowhere", "/proc/nowhere"},
     };
-    for (const auto& c : cases) {
-        const Outcome result = run("register", c.arguments);
-        EXPECT_EQ(result.status, 1) << c.arguments;
-        EXPECT_EQ(result.out, "") << c.arguments;
-        EXPECT_THAT(result.err, HasSubstr(c.text)) << c.arguments;
-        EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
-        EXPECT_FALSE(fs::exists(path("kel-out"))) << c.arguments;
-    }
+    for (const auto& [arguments, text] : cases)
+        expectRefusal("register", arguments, text);
     EXPECT_EQ(run("register", "--help").status, 0);
 }
 
@@ -374,7 +337,7 @@ TEST_F(Programs, StabilizeReadsAndWritesY4m) {
         EXPECT_EQ(cropped.out.find('\0', at), std::string::npos) << "empty corners would be black";
 }
 
-TEST_F(Programs, StabilizeAnswersBadInputWithOneLineAndWritesNothing) {
+TEST_F(Programs, StabilizeRefusesInOneLineAndWritesNothing) {
     const std::string bytes(64 * 48 * 2, 'x'), y4m = "YUV4MPEG2 W64 H48 F30:1";
     const std::pair<const char*, std::string> files[] = {
         {"short.uyvy", "abc"},
@@ -391,9 +354,7 @@ TEST_F(Programs, StabilizeAnswersBadInputWithOneLineAndWritesNothing) {
     };
     for (const auto& [name, content] : files)
         write(name, content);
-    const struct {
-        const char *arguments, *text;
-    } cases[] = {
+    const std::pair<const char*, const char*> cases[] = {
         {"short.uyvy --size 64x48", "no whole number"},
         {"--size 64x48 < empty.uyvy", "no whole number"},
         {"half.uyvy --size 64x48", "no whole number"},
@@ -418,14 +379,8 @@ TEST_F(Programs, StabilizeAnswersBadInputWithOneLineAndWritesNothing) {
         {"open.y4m", "no end"},
         {"cut.y4m --size 32x48", "64x48, not 32x48"},
     };
-    for (const auto& c : cases) {
-        const Outcome result =
-            run("stabilize", c.arguments + std::string(std::strstr(c.arguments, "output") ? "" : " --output out"));
-        EXPECT_EQ(result.status, 1) << c.arguments;
-        EXPECT_THAT(result.err, HasSubstr(c.text)) << c.arguments;
-        EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
-        EXPECT_FALSE(fs::exists(path("out")));
-    }
+    for (const auto& [arguments, text] : cases)
+        expectRefusal("stabilize", arguments + std::string(std::strstr(arguments, "output") ? "" : " --output out"), text);
     EXPECT_EQ(run("stabilize", "frame.uyvy --size 64x48 --output out").status, 0) << "one frame without features";
     EXPECT_EQ(contents(path("out")), contents(path("frame.uyvy")));
     std::string yuyv = shakingVideo(renderScene(21).first, 320, 240, 1);
@@ -516,9 +471,11 @@ TEST_F(Programs, CalibrateRecoversTheCamera) {
         }
     EXPECT_EQ(parameters, 8);
     EXPECT_EQ(run("calibrate", "--outliers 1").status, 2);
-    for (const char* arguments : {"--pairs 5", "--pairs 10001", "--noise nan", "--outliers nan", "--noise -1", "--outliers 1.5",
-                                  "--output /proc/nowhere", "extra"})
-        EXPECT_EQ(run("calibrate", arguments).status, 1) << arguments;
+    fs::remove_all(path("kel-out"));
+    for (const std::string arguments :
+         {"--pairs 5", "--pairs 10001", "--noise nan", "--outliers nan", "--noise -1", "--outliers 1.5", "extra"})
+        expectRefusal("calibrate", arguments, arguments.substr(0, arguments.find(' ')));
+    expectRefusal("calibrate", "--output /proc/nowhere", "/proc/nowhere: cannot be made");
 }
 
 // Real photographs, where a folder of them is named at configure time.
@@ -530,11 +487,11 @@ TEST_F(Programs, RegisterFindsKnownHomographiesOfPhotographs) {
     for (const auto& [first, second] : pairs) {
         const std::string a = (photos / (std::string(first) + ".pgm")).string(),
                           b = (photos / (std::string(second) + ".pgm")).string();
-        const Image picture = readPicture(a);
-        const kelMat truth = homographyIn(contents(photos / (std::string(first) + "_to_" + second + ".txt")));
+        const Image left = readPicture(a), right = readPicture(b);
+        const Plane truth = homographyIn(contents(photos / (std::string(first) + "_to_" + second + ".txt")));
         const Outcome result = run("register", a + " " + b);
         EXPECT_EQ(result.status, 0) << result.err;
-        EXPECT_LT(meanError(homographyIn(result.out), truth, picture->width, picture->height), 3) << first;
+        EXPECT_LT(meanError(homographyIn(result.out), truth, left.get(), right.get()), 3) << first;
     }
     EXPECT_EQ(run("register", (photos / "graf1.pgm").string() + " " + (photos / "cityA.pgm").string()).status, 2);
 }

@@ -8,6 +8,7 @@
 #include <random>
 
 #include <kel/kelImage.hpp>
+#include <kel/kelMat.h>
 
 namespace kel_test {
 
@@ -42,6 +43,12 @@ struct Plane {
         return adjugate;
     }
 };
+
+inline Plane planeOf(const kelMat& H) {
+    Plane plane;
+    std::copy_n(H.m_Data, 9, plane.m);
+    return plane;
+}
 
 // Mean distance between where two take a grid of points of a first picture that `truth` takes into the second one.
 inline double meanError(const Plane& is, const Plane& truth, const kelImage_t* first, const kelImage_t* second) {
