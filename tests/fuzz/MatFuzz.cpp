@@ -27,7 +27,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
     Input input(data, size);
     const auto& list = kel_test::matOperations();
     const MatOperation& o = list[input.byte() % list.size()];
-    const int rows = input.between(o.least, 40), columns = o.form == MatOperation::Any ? input.between(1, 15) : rows;
+    const int rows = input.between(o.least, 40), columns = o.form == MatOperation::Any ? input.between(o.least, 15) : rows;
     kelMat A = someMatrix(input, rows, columns), B = someMatrix(input, rows, columns);
     if (o.form == MatOperation::Symmetric) {
         A = A + A.getTransposedMatrix();

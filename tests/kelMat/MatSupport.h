@@ -37,10 +37,10 @@ inline Truth truth(const kelMat& M) {
     return T;
 }
 
-inline kelMat matrix(const Reference& R) {
-    kelMat M(R.rows, R.columns, false);
-    std::copy(R.data.begin(), R.data.end(), M.m_Data);
-    return M;
+inline kelMat identity(int n) {
+    kelMat I(n, n);
+    I.setDataIdentity(1);
+    return I;
 }
 
 inline kelMat randomMatrix(int rows, int columns, uint32_t salt) {

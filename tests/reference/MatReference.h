@@ -14,7 +14,8 @@ template <class T> struct Mat {
     int rows, columns;
     std::vector<T> data;
 
-    explicit Mat(int rows = 0, int columns = 0) : rows(rows), columns(columns), data(static_cast<size_t>(rows) * columns) {}
+    explicit Mat(int rows = 0, int columns = 0) // 0 x 0 without rows
+        : rows(rows), columns(rows > 0 ? columns : 0), data(static_cast<size_t>(rows) * columns) {}
     T* operator[](int r) { return data.data() + static_cast<ptrdiff_t>(r) * columns; }
     const T* operator[](int r) const { return data.data() + static_cast<ptrdiff_t>(r) * columns; }
 };
@@ -34,7 +35,7 @@ template <class T> Mat<T> transposed(const Mat<T>& A) {
     return R;
 }
 
-template <class T> Mat<T> product(const Mat<T>& A, const Mat<T>& B) {
+template <class T> Mat<T> operator*(const Mat<T>& A, const Mat<T>& B) {
     Mat<T> R(A.rows, B.columns);
     for (int i = 0; i < A.rows; ++i)
         for (int j = 0; j < B.columns; ++j)
@@ -60,7 +61,7 @@ template <class T> T pythag(T a, T b) {
 }
 
 // Crout, column by column.
-template <class T> bool ludcmp(Mat<T>& a, int* indx, T* d) {
+template <class T> bool nr_ludcmp(Mat<T>& a, int* indx, T* d) {
     const int n = a.columns;
     *d = 1;
     std::vector<T> vv(n);
@@ -106,7 +107,7 @@ template <class T> bool ludcmp(Mat<T>& a, int* indx, T* d) {
     return true;
 }
 
-template <class T> void lubksb(const Mat<T>& a, const int* indx, T* b) {
+template <class T> void nr_lubksb(const Mat<T>& a, const int* indx, T* b) {
     const int n = a.columns;
     bool set = false;
     int ii = 0;
@@ -131,25 +132,76 @@ template <class T> void lubksb(const Mat<T>& a, const int* indx, T* b) {
     }
 }
 
+template <class T> T determinant(const Mat<T>& A) {
+    const int n = A.columns;
+    if (n == 2)
+        return A[0][0] * A[1][1] - A[0][1] * A[1][0];
+    if (n == 3) {
+        const T top = (A[1][0] * A[2][1] - A[1][1] * A[2][0]) * A[0][2];
+        const T middle = (A[2][0] * A[0][1] - A[2][1] * A[0][0]) * A[1][2] + top;
+        return (A[0][0] * A[1][1] - A[0][1] * A[1][0]) * A[2][2] + middle;
+    }
+    std::vector<int> indx(n);
+    Mat<T> LU = A;
+    T product;
+    nr_ludcmp(LU, indx.data(), &product);
+    for (int i = 0; i < n; ++i)
+        product *= LU[i][i];
+    return product;
+}
+
+// For orders 2 and 3.
+template <class T> Mat<T> adjugate(const Mat<T>& A) {
+    if (A.columns == 2) {
+        Mat<T> R(2, 2);
+        R.data = {A[1][1], -A[0][1], -A[1][0], A[0][0]};
+        return R;
+    }
+    Mat<T> R(3, 3);
+    for (int i = 0; i < 3; ++i)
+        for (int j = 0; j < 3; ++j) {
+            const int r = (j + 1) % 3, rr = (j + 2) % 3, c = (i + 1) % 3, cc = (i + 2) % 3;
+            R[i][j] = A[r][c] * A[rr][cc] - A[r][cc] * A[rr][c];
+        }
+    return R;
+}
+
 template <class T> bool inverse(const Mat<T>& A, Mat<T>& R) {
     const int n = A.columns;
+    if (n <= 3) {
+        const T det = determinant(A);
+        if (det == 0)
+            return false;
+        R = adjugate(A);
+        for (T& x : R.data)
+            x /= det;
+        return true;
+    }
     std::vector<int> indx(n);
     Mat<T> LU = A;
     T d;
-    if (!ludcmp(LU, indx.data(), &d))
+    if (!nr_ludcmp(LU, indx.data(), &d))
         return false;
     R = Mat<T>(n, n);
     for (int j = 0; j < n; ++j) {
         std::vector<T> column(n);
         column[j] = 1;
-        lubksb(LU, indx.data(), column.data());
+        nr_lubksb(LU, indx.data(), column.data());
         for (int i = 0; i < n; ++i)
             R[i][j] = column[i];
     }
     return true;
 }
 
-template <class T> bool choldc(Mat<T>& a) {
+template <class T> bool pseudoInverse(const Mat<T>& A, Mat<T>& R) {
+    Mat<T> Q;
+    const bool regular = inverse(transposed(A) * A, Q);
+    if (regular)
+        R = Q * transposed(A);
+    return regular;
+}
+
+template <class T> bool nr_choldc(Mat<T>& a) {
     const int n = a.columns;
     for (int i = 0; i < n; ++i)
         for (int j = 0; j <= i; ++j) {
@@ -180,83 +232,82 @@ template <class T> void rotateColumns(Mat<T>& M, int p, int q, T c, T s) {
     }
 }
 
-template <class T> bool svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>& v) {
+// What is left of a row or a column from one of its elements on.
+template <class T> struct Line {
+    T* data;
+    ptrdiff_t first, step;
+    int length;
+
+    T& operator[](int i) const { return data[first + i * step]; }
+};
+template <class T> Line<T> row(Mat<T>& M, ptrdiff_t r, int c) {
+    return {M.data.data(), r * M.columns + c, 1, M.columns - c};
+}
+template <class T> Line<T> column(Mat<T>& M, int c, int r) {
+    return {M.data.data(), r * static_cast<ptrdiff_t>(M.columns) + c, M.columns, M.rows - r};
+}
+template <class T> T dot(Line<T> x, Line<T> y) {
+    T sum = 0;
+    for (int i = 0; i < x.length; ++i)
+        sum += x[i] * y[i];
+    return sum;
+}
+template <class T> void addMultiple(Line<T> to, T factor, Line<T> from) {
+    for (int i = 0; i < to.length; ++i)
+        to[i] += factor * from[i];
+}
+
+// The Householder vector in place of x, apply(h) for what it is to reflect, and what the first element of x becomes; 0 for zeros.
+template <class T, class Apply> T reflect(Line<T> x, Apply apply) {
+    T scale = 0, s = 0;
+    for (int i = 0; i < x.length; ++i)
+        scale += std::fabs(x[i]);
+    if (scale == 0)
+        return 0;
+    for (int i = 0; i < x.length; ++i) {
+        x[i] /= scale;
+        s += x[i] * x[i];
+    }
+    const T f = x[0], g = -(sign(f) * std::sqrt(s));
+    x[0] = f - g;
+    apply(f * g - s);
+    for (int i = 0; i < x.length; ++i)
+        x[i] *= scale;
+    return scale * g;
+}
+
+template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>& v) {
     const int m = a.rows, n = a.columns;
     u = a;
     v = Mat<T>(n, n);
     W = Mat<T>(n, n);
-    std::vector<T> w(n), e(n);
+    std::vector<T> w(n), e(n + 1), scaled(n); // diagonal, superdiagonal from e[1] on
     T norm = 0;
-
-    T carried = 0; // superdiagonal element of the row before
     for (int i = 0; i < n; ++i) {
-        e[i] = carried;
-        w[i] = 0;
-        carried = 0;
-        T scale = 0;
-        for (int r = i; r < m; ++r)
-            scale += std::fabs(u[r][i]);
-        if (scale != 0) {
-            T s = 0;
-            for (int r = i; r < m; ++r) {
-                u[r][i] /= scale;
-                s += u[r][i] * u[r][i];
-            }
-            const T f = u[i][i], g = -(sign(f) * std::sqrt(s)), h = f * g - s;
-            u[i][i] = f - g;
-            for (int c = i + 1; c < n; ++c) {
-                T sum = 0;
-                for (int r = i; r < m; ++r)
-                    sum += u[r][i] * u[r][c];
-                const T factor = sum / h;
-                for (int r = i; r < m; ++r)
-                    u[r][c] += factor * u[r][i];
-            }
-            for (int r = i; r < m; ++r)
-                u[r][i] *= scale;
-            w[i] = scale * g;
-        }
-        scale = 0;
-        if (i < m)
-            for (int c = i + 1; c < n; ++c)
-                scale += std::fabs(u[i][c]);
-        if (scale != 0) {
-            T s = 0;
-            for (int c = i + 1; c < n; ++c) {
-                u[i][c] /= scale;
-                s += u[i][c] * u[i][c];
-            }
-            const T f = u[i][i + 1], g = -(sign(f) * std::sqrt(s)), h = f * g - s;
-            u[i][i + 1] = f - g;
-            std::vector<T> direction(n);
-            for (int c = i + 1; c < n; ++c)
-                direction[c] = u[i][c] / h;
-            for (int r = i + 1; r < m; ++r) {
-                T sum = 0;
+        if (i < m) {
+            const Line<T> below = column(u, i, i), beside = row(u, i, i + 1), direction = {scaled.data(), 0, 1, n - i - 1};
+            w[i] = reflect(below, [&](T h) {
                 for (int c = i + 1; c < n; ++c)
-                    sum += u[r][c] * u[i][c];
-                for (int c = i + 1; c < n; ++c)
-                    u[r][c] += sum * direction[c];
-            }
-            for (int c = i + 1; c < n; ++c)
-                u[i][c] *= scale;
-            carried = scale * g;
+                    addMultiple(column(u, c, i), dot(below, column(u, c, i)) / h, below);
+            });
+            e[i + 1] = reflect(beside, [&](T h) {
+                for (int c = 0; c < beside.length; ++c)
+                    direction[c] = beside[c] / h;
+                for (int r = i + 1; r < m; ++r)
+                    addMultiple(row(u, r, i + 1), dot(row(u, r, i + 1), beside), direction);
+            });
         }
         const T size = std::fabs(w[i]) + std::fabs(e[i]);
         norm = norm > size ? norm : size;
     }
 
     for (int i = n - 1; i >= 0; --i) {
-        if (i + 1 < n && e[i + 1] != 0) {
+        if (e[i + 1] != 0) {
+            const Line<T> beside = row(u, i, i + 1), below = column(v, i, i + 1);
+            for (int k = 0; k < beside.length; ++k)
+                below[k] = (beside[k] / beside[0]) / e[i + 1];
             for (int c = i + 1; c < n; ++c)
-                v[c][i] = (u[i][c] / u[i][i + 1]) / e[i + 1];
-            for (int c = i + 1; c < n; ++c) {
-                T sum = 0;
-                for (int k = i + 1; k < n; ++k)
-                    sum += u[i][k] * v[k][c];
-                for (int k = i + 1; k < n; ++k)
-                    v[k][c] += sum * v[k][i];
-            }
+                addMultiple(column(v, c, i + 1), dot(beside, column(v, c, i + 1)), below);
         }
         for (int c = i + 1; c < n; ++c)
             v[i][c] = v[c][i] = 0;
@@ -266,22 +317,13 @@ template <class T> bool svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>& v)
     for (int i = (m < n ? m : n) - 1; i >= 0; --i) {
         for (int c = i + 1; c < n; ++c)
             u[i][c] = 0;
-        if (w[i] == 0) {
-            for (int r = i; r < m; ++r)
-                u[r][i] = 0;
-        } else {
-            const T reciprocal = T(1) / w[i];
-            for (int c = i + 1; c < n; ++c) {
-                T sum = 0;
-                for (int r = i + 1; r < m; ++r)
-                    sum += u[r][i] * u[r][c];
-                const T factor = (sum / u[i][i]) * reciprocal;
-                for (int r = i; r < m; ++r)
-                    u[r][c] += factor * u[r][i];
-            }
-            for (int r = i; r < m; ++r)
-                u[r][i] *= reciprocal;
-        }
+        const Line<T> whole = column(u, i, i), rest = column(u, i, i + 1);
+        const T reciprocal = T(1) / w[i];
+        if (w[i] != 0)
+            for (int c = i + 1; c < n; ++c)
+                addMultiple(column(u, c, i), (dot(rest, column(u, c, i + 1)) / u[i][i]) * reciprocal, whole);
+        for (int r = 0; r < whole.length; ++r)
+            whole[r] = w[i] == 0 ? T(0) : whole[r] * reciprocal;
         u[i][i] += T(1);
     }
 
@@ -362,7 +404,7 @@ template <class T> bool svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>& v)
     return converged;
 }
 
-template <class T> bool jacobi(Mat<T>& a, Mat<T>& d, Mat<T>& v, int* nrot) {
+template <class T> bool nr_jacobi(Mat<T>& a, Mat<T>& d, Mat<T>& v, int* nrot) {
     const int n = a.columns;
     d = Mat<T>(n, 1);
     v = identity<T>(n);
@@ -430,31 +472,18 @@ template <class T> bool jacobi(Mat<T>& a, Mat<T>& d, Mat<T>& v, int* nrot) {
     return false;
 }
 
-template <class T> Mat<T> adjugateInverse3x3(const Mat<T>& A) {
-    Mat<T> R(3, 3);
-    T det = (A[1][0] * A[2][1] - A[1][1] * A[2][0]) * A[0][2];
-    det = (A[2][0] * A[0][1] - A[2][1] * A[0][0]) * A[1][2] + det;
-    det = (A[0][0] * A[1][1] - A[0][1] * A[1][0]) * A[2][2] + det;
-    for (int i = 0; i < 3; ++i)
-        for (int j = 0; j < 3; ++j) {
-            const int r = (j + 1) % 3, rr = (j + 2) % 3, c = (i + 1) % 3, cc = (i + 2) % 3;
-            R[i][j] = (A[r][c] * A[rr][cc] - A[r][cc] * A[rr][c]) / det;
-        }
-    return R;
-}
-
-// A x = lambda B x for n > 3, through L^-1 A L^-T.
+// A x = lambda B x, through L^-1 A L^-T.
 template <class T> void generalizedEigen(const Mat<T>& A, const Mat<T>& B, Mat<T>& d, Mat<T>& X) {
-    Mat<T> L = B, M(0, 0), Y;
-    choldc(L);
+    Mat<T> L = B, M, Y;
+    nr_choldc(L);
     if (!inverse(transposed(L), M)) {
-        d = X = Mat<T>(0, 0);
+        d = X = Mat<T>();
         return;
     }
-    Mat<T> C = product(product(transposed(M), A), M);
+    Mat<T> C = transposed(M) * A * M;
     int rotations;
-    jacobi(C, d, Y, &rotations);
-    X = product(M, Y);
+    nr_jacobi(C, d, Y, &rotations);
+    X = M * Y;
 }
 
 } // namespace kel_ref

@@ -9,52 +9,64 @@ namespace kel_test {
 
 namespace {
 
-// Results one behind the other.
-class Results {
-public:
-    Results& add(double value) {
-        m_all.push_back(static_cast<float>(value));
-        return *this;
-    }
-    Results& add(const Reference& M) {
-        add(M.rows).add(M.columns);
-        m_all.insert(m_all.end(), M.data.begin(), M.data.end());
-        return *this;
-    }
-    Results& add(const kelMat& M) { return add(reference(M)); }
-    template <class T> Results& add(const std::vector<T>& values) {
-        m_all.insert(m_all.end(), values.begin(), values.end());
-        return *this;
-    }
-    operator Floats() const { return m_all; }
+void append(Floats& all, double value) {
+    all.push_back(static_cast<float>(value));
+}
+template <class T> void append(Floats& all, const std::vector<T>& values) {
+    all.insert(all.end(), values.begin(), values.end());
+}
+void append(Floats& all, const Reference& M) {
+    append(all, M.rows);
+    append(all, M.columns);
+    append(all, M.data);
+}
+void append(Floats& all, const kelMat& M) {
+    append(all, reference(M));
+}
+template <class... Parts> Floats results(const Parts&... parts) {
+    Floats all;
+    (append(all, parts), ...);
+    return all;
+}
 
-private:
-    Floats m_all;
-};
+// What is a member of kelMat, under the name that the reference has for it.
+kelMat transposed(const kelMat& A) {
+    return A.getTransposedMatrix();
+}
+float determinant(const kelMat& A) {
+    return A.getDeterminant();
+}
+bool inverse(const kelMat& A, kelMat& R) {
+    return A.getInversedMatrix(R);
+}
+bool pseudoInverse(const kelMat& A, kelMat& R) {
+    return A.getInversedMatrix_Pseudo(R);
+}
+void generalizedEigen(kelMat& A, kelMat& B, kelMat& d, kelMat& X) {
+    A.getGeneralizedEigenValue(B, d, X);
+}
 
-// Decomposition, then a solution for a right side whose second element is 0 and another with leading zeros; T is kelMat or Reference.
-template <class T, class Decompose, class Solve> Floats systems(T A, int n, Decompose decompose, Solve solve) {
+// Decomposition, then a solution for a right side whose second element is 0 and another with leading zeros.
+template <class T> Floats systems(T A) {
+    const int n = reference(A).columns;
     std::vector<int> indx(n, -7);
     float parity = 0;
-    const bool solved = decompose(A, indx.data(), &parity);
-    Results results;
-    results.add(solved).add(parity).add(A).add(indx);
+    const bool solved = nr_ludcmp(A, indx.data(), &parity);
+    Floats all = results(solved, parity, A, indx);
     for (int zeros : {0, n / 2}) {
         Floats b(n);
         for (int i = zeros; i < n; ++i)
             b[i] = static_cast<float>(i - 1);
         if (solved)
-            solve(A, indx.data(), b.data());
-        results.add(b);
+            nr_lubksb(A, indx.data(), b.data());
+        append(all, b);
     }
-    return results;
+    return all;
 }
 
-template <class T> Floats jacobi(T A, bool (*solve)(T&, T&, T&, int*)) {
-    T d, v;
-    int rotations = -1;
-    const bool solved = solve(A, d, v, &rotations);
-    return Results().add(solved).add(rotations).add(A).add(d).add(v); // the lower triangle of A stays
+// `call` takes matrices of the library and of the reference alike.
+template <class F> MatOperation operation(const char* name, MatOperation::Form form, int least, F call) {
+    return {name, call, call, form, least};
 }
 
 } // namespace
@@ -66,60 +78,32 @@ Reference reference(const kelMat& M) {
 }
 
 const std::vector<MatOperation>& matOperations() {
-    using M = kelMat;
-    using R = Reference;
+    constexpr auto any = MatOperation::Any, square = MatOperation::Square, symmetric = MatOperation::Symmetric;
     static const std::vector<MatOperation> list = {
-        {"product", [](M A, M B) -> Floats { return Results().add(A * B.getTransposedMatrix()); },
-         [](R A, R B) -> Floats { return Results().add(kel_ref::product(A, kel_ref::transposed(B))); }, MatOperation::Any},
-        {"nr_ludcmp, nr_lubksb", [](M A, M) { return systems(A, A.m_Width, nr_ludcmp, nr_lubksb); },
-         [](R A, R) { return systems(A, A.columns, kel_ref::ludcmp<float>, kel_ref::lubksb<float>); }},
-        {"getInversedMatrix",
-         [](M A, M) -> Floats {
-             M inverse;
-             const bool regular = A.getInversedMatrix(inverse);
-             return Results().add(regular).add(inverse);
-         },
-         [](R A, R) -> Floats {
-             R inverse;
-             const bool regular = kel_ref::inverse(A, inverse);
-             return Results().add(regular).add(inverse);
-         },
-         MatOperation::Square, 4},
-        {"nr_choldc",
-         [](M A, M) -> Floats {
-             const bool definite = nr_choldc(A);
-             return Results().add(definite).add(A);
-         },
-         [](R A, R) -> Floats {
-             const bool definite = kel_ref::choldc(A);
-             return Results().add(definite).add(A);
-         }},
-        {"nr_svdcmp",
-         [](M A, M) -> Floats {
-             M u, w, v;
-             const bool converged = A.getDecomposedMatrix_SV(u, w, v);
-             return Results().add(converged).add(w).add(v).add(u).add(A);
-         },
-         [](R A, R) -> Floats {
-             R u, w, v;
-             const bool converged = kel_ref::svdcmp(A, u, w, v);
-             return Results().add(converged).add(w).add(v).add(u).add(A);
-         },
-         MatOperation::Any},
-        {"nr_jacobi", [](M A, M) { return jacobi<M>(A, nr_jacobi); },
-         [](R A, R) { return jacobi<R>(A, kel_ref::jacobi<float>); }},
-        {"getGeneralizedEigenValue",
-         [](M A, M B) -> Floats {
-             M d(1, 1), x(1, 1);
-             A.getGeneralizedEigenValue(B, d, x);
-             return Results().add(d).add(x).add(A).add(B);
-         },
-         [](R A, R B) -> Floats {
-             R d, x;
-             kel_ref::generalizedEigen(A, B, d, x);
-             return Results().add(d).add(x).add(A).add(B);
-         },
-         MatOperation::Symmetric, 4},
+        operation("product", any, 1, [](auto A, auto B) { return results(A * transposed(B)); }),
+        operation("nr_ludcmp, nr_lubksb", square, 1, [](auto A, auto) { return systems(A); }),
+        operation("getDeterminant", square, 2, [](auto A, auto) { return results(determinant(A)); }),
+        // R holds something, which stays where A is singular.
+        operation("getInversedMatrix", square, 2, [](auto A, auto R) { return results(inverse(A, R), R); }),
+        operation("getInversedMatrix_Pseudo", any, 2, [](auto A, auto R) { return results(pseudoInverse(A, R), R); }),
+        operation("nr_choldc", square, 1, [](auto A, auto) { return results(nr_choldc(A), A); }),
+        operation("nr_svdcmp", any, 1,
+                  [](auto A, auto) {
+                      decltype(A) u, w, v;
+                      return results(nr_svdcmp(A, u, w, v), w, v, u, A);
+                  }),
+        operation("nr_jacobi", square, 1,
+                  [](auto A, auto) {
+                      decltype(A) d, v;
+                      int rotations = -1;
+                      return results(nr_jacobi(A, d, v, &rotations), rotations, A, d, v); // the lower triangle of A stays
+                  }),
+        operation("getGeneralizedEigenValue", symmetric, 2,
+                  [](auto A, auto B) {
+                      decltype(A) d(1, 1), X(1, 1);
+                      generalizedEigen(A, B, d, X);
+                      return results(d, X, A, B);
+                  }),
     };
     return list;
 }

@@ -17,13 +17,16 @@ struct MatOperation {
     const char* name;
     Floats (*call)(kelMat A, kelMat B);
     Floats (*reference)(Reference A, Reference B);
-    enum Form { Any, Square, Symmetric } form = Square; // of A; B is as wide and high, positive definite where A is symmetric
-    int least = 1;                                      // order that it is for
+    enum Form { Any, Square, Symmetric } form; // of A; B is as wide and high, positive definite where A is symmetric
+    int least;                                 // order that it is for, columns where rows may be more or fewer
 };
 
 const std::vector<MatOperation>& matOperations();
 
 Reference reference(const kelMat& M);
+inline const Reference& reference(const Reference& M) {
+    return M;
+}
 
 // Equal bits; any NaN equals any other.
 bool sameFloat(float a, float b);
