@@ -79,18 +79,6 @@ TEST(MatrixProduct, SumsInTheOrderOfThePlainLoop) {
     EXPECT_TRUE(same(mat({{0, 1}}) * mat({{kInfinity}, {1}}), mat({{kNan}})));
 }
 
-TEST(MatrixProduct, ReadsAndWritesNothingBeside) {
-    for (Protect side : {Protect::Behind, Protect::Before}) {
-        const ProtectedMemory memory(side);
-        for (int n = 1; n <= 20; ++n) {
-            const kelMat A = randomMatrix(n, n + 1, 5), B = randomMatrix(n + 1, n, 6);
-            const kelMat AB = A * B, sum = AB + AB, joined = AB | sum, T = A.getTransposedMatrix();
-            EXPECT_TRUE(sameSize(joined, n, 2 * n));
-            EXPECT_GE((T, T) + A.getNorm() + AB.getTrace(), 0.0f);
-        }
-    }
-}
-
 TEST(MatrixDot, AddsInStorageOrder) {
     // 2^24 + 1 - 2^24 - ... : another order of the sum gives another result.
     const kelMat A = mat({{16777216, 1, 1}, {-16777216, 1, 0.5f}}), ones = mat({{1, 1, 1}, {1, 1, 1}});
@@ -121,29 +109,25 @@ TEST(MatrixTranspose, SwapsRowsAndColumns) {
     EXPECT_TRUE(sameSize(kelMat().getTransposedMatrix(), 0, 0));
 }
 
-TEST(MatrixMemory, TakesOneBlockAResult) {
-    if (!ownMalloc())
-        GTEST_SKIP() << "another malloc is in use";
-    for (int n : {3, 4, 12}) {
-        const kelMat A = randomMatrix(n, n, 8), B = randomMatrix(n, n, 9);
-        const std::function<kelMat()> operations[] = {[&] { return A + 1.0f; },
-                                                      [&] { return A / 2.0f; },
-                                                      [&] { return A + B; },
-                                                      [&] { return A - B; },
-                                                      [&] { return A * B; },
-                                                      [&] { return A | B; },
-                                                      [&] { return kelMat(A); },
-                                                      [&] { return A.getTransposedMatrix(); },
-                                                      [&] { return A.getInversedMatrix(); }};
-        for (const auto& operation : operations) {
-            const CountedMemory memory;
-            {
-                const kelMat result = operation();
-                EXPECT_EQ(memory.allocated(), 1);
+TEST(MatrixMemory, IsOneBlockAResultAndNothingBesideIsTouched) {
+    for (Protect side : {Protect::Behind, Protect::Before})
+        for (int n = 1; n <= 20; ++n) {
+            const ProtectedMemory protection(side);
+            const kelMat A = randomMatrix(n, n, 8), B = randomMatrix(n, n, 9);
+            EXPECT_GE((A, A) + A.getNorm() + A.getTrace(), 0.0f);
+            const std::function<kelMat()> operations[] = {[&] { return A + 1.0f; },  [&] { return A / 2.0f; },
+                                                          [&] { return A + B; },     [&] { return A - B; },
+                                                          [&] { return A * B; },     [&] { return A | B; },
+                                                          [&] { return kelMat(A); }, [&] { return A.getTransposedMatrix(); }};
+            for (const auto& operation : operations) {
+                const CountedMemory memory;
+                {
+                    const kelMat result = operation();
+                    EXPECT_TRUE(memory.allocated() == 1 || !ownMalloc());
+                }
+                EXPECT_EQ(memory.held(), 0);
             }
-            EXPECT_EQ(memory.held(), 0);
         }
-    }
 }
 
 // ---- points ----------------------------------------------------------------------------------------------------------------

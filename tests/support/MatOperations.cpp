@@ -9,26 +9,6 @@ namespace kel_test {
 
 namespace {
 
-void append(Floats& all, double value) {
-    all.push_back(static_cast<float>(value));
-}
-template <class T> void append(Floats& all, const std::vector<T>& values) {
-    all.insert(all.end(), values.begin(), values.end());
-}
-void append(Floats& all, const Reference& M) {
-    append(all, M.rows);
-    append(all, M.columns);
-    append(all, M.data);
-}
-void append(Floats& all, const kelMat& M) {
-    append(all, reference(M));
-}
-template <class... Parts> Floats results(const Parts&... parts) {
-    Floats all;
-    (append(all, parts), ...);
-    return all;
-}
-
 // What is a member of kelMat, under the name that the reference has for it.
 kelMat transposed(const kelMat& A) {
     return A.getTransposedMatrix();
@@ -70,6 +50,18 @@ template <class F> MatOperation operation(const char* name, MatOperation::Form f
 }
 
 } // namespace
+
+void append(Floats& all, double value) {
+    all.push_back(static_cast<float>(value));
+}
+void append(Floats& all, const Reference& M) {
+    append(all, M.rows);
+    append(all, M.columns);
+    append(all, M.data);
+}
+void append(Floats& all, const kelMat& M) {
+    append(all, reference(M));
+}
 
 Reference reference(const kelMat& M) {
     Reference R(M.m_Height, M.m_Width);

@@ -28,6 +28,19 @@ inline const Reference& reference(const Reference& M) {
     return M;
 }
 
+// All of these one behind the other.
+void append(Floats& all, double value);
+void append(Floats& all, const Reference& M);
+void append(Floats& all, const kelMat& M);
+template <class T> void append(Floats& all, const std::vector<T>& values) {
+    all.insert(all.end(), values.begin(), values.end());
+}
+template <class... Parts> Floats results(const Parts&... parts) {
+    Floats all;
+    (append(all, parts), ...);
+    return all;
+}
+
 // Equal bits; any NaN equals any other.
 bool sameFloat(float a, float b);
 bool sameFloats(const Floats& a, const Floats& b);
