@@ -15,8 +15,9 @@ constexpr int kLanes = 4;
 using Floats = float __attribute__((vector_size(4 * kLanes)));
 using Mask = int32_t __attribute__((vector_size(4 * kLanes))); // of a comparison: -1 where it holds, else 0
 
-using FloatsAt = float __attribute__((vector_size(4 * kLanes), aligned(4), may_alias)); // among floats in memory
-using AlignedAt = float __attribute__((vector_size(4 * kLanes), may_alias));            // at a multiple of 16
+using FloatsAt __attribute__((vector_size(4 * kLanes), aligned(4), may_alias)) = float; // among floats in memory
+using AlignedAt __attribute__((vector_size(4 * kLanes), may_alias)) = float;            // at a multiple of 16
+static_assert(alignof(FloatsAt) == 4, "not every compiler heeds it behind the name of the type");
 
 inline Floats load(const float* p) {
     return *reinterpret_cast<const FloatsAt*>(p);
