@@ -1,5 +1,5 @@
-// What the fuzz targets share: numbers from the input's bytes, twins of an image for library and reference, and comparisons that
-// stop the run.
+// What the fuzz targets share: numbers from the input's bytes, and twins of an image for library and reference, whose
+// comparison stops the run.
 #ifndef KEL_TESTS_FUZZ_H
 #define KEL_TESTS_FUZZ_H
 
@@ -79,16 +79,6 @@ struct Twins {
             fail(what);
     }
 };
-
-// Equal bits; any NaN equals any other.
-inline bool sameFloat(float a, float b) {
-    return std::memcmp(&a, &b, sizeof a) == 0 || (std::isnan(a) && std::isnan(b));
-}
-inline void expectSame(const float* a, const float* b, size_t count, const char* what) {
-    for (size_t i = 0; i < count; ++i)
-        if (!sameFloat(a[i], b[i]))
-            fail(what);
-}
 
 } // namespace kel_fuzz
 

@@ -133,18 +133,9 @@ TEST(MatrixMemory, IsOneBlockAResultAndNothingBesideIsTouched) {
 // ---- points ----------------------------------------------------------------------------------------------------------------
 
 TEST(MatrixPoints, GoThroughAHomography) {
-    kelMat I(3, 3);
-    I.setDataIdentity(1);
-    float u = 0, v = 0;
-    I.cvtPoint(2.0f, 3.0f, &u, &v);
-    EXPECT_EQ(u, 2.0f);
-    EXPECT_EQ(v, 3.0f);
-    I[2][2] = 2;
-    I.cvtPoint(2.0f, 3.0f, &u, &v);
-    EXPECT_EQ(u, 1.0f);
-    EXPECT_EQ(v, 1.5f);
-    I[2][2] = 0;
-    I.cvtPoint(2.0f, 0.0f, &u, &v);
+    kelMat pole = mat({{1, 0, 0}, {0, 1, 0}, {0, 0, 0}});
+    float u, v;
+    pole.cvtPoint(2.0f, 0.0f, &u, &v);
     EXPECT_EQ(u, kInfinity);
     EXPECT_TRUE(std::isnan(v));
 

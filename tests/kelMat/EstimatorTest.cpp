@@ -102,9 +102,12 @@ TYPED_TEST(Correspondences, AreTreatedAsByTheReference) {
                 value *= k < TypeParam::kColumns - 1 ? 1e-4f : 1e-2f;
         check(set);
     }
-    typename TypeParam::Set set; // all singular values are equal
-    for (int i = 0; i < 6; ++i)
-        TypeParam::add(set, {0, 0, 0, 0, 0});
+    typename TypeParam::Set set = pairs<TypeParam>(9, 1, 0, random);
+    for (auto values : TypeParam::kCoordinates) { // in a plane, on a line, at one place, where all singular values are equal
+        std::fill_n((set.*values).begin(), 9, 0.0f);
+        check(set);
+    }
+    (set.*TypeParam::kCoordinates[0])[3] = kNan;
     check(set);
 }
 
@@ -194,50 +197,22 @@ TEST(FourPoints, GiveTheHomographyThroughThem) {
     EXPECT_FALSE(std::isfinite(H[0][0]));
 }
 
-TEST(Taubin, FillsWithNaNWhereTheEigenproblemHasNoSolution) {
-    testing::internal::CaptureStdout();
-    kelMatCorrespH onAxis, notANumber, atOrigin;
-    kelMatCorrespP plane;
-    for (int i = 0; i < 8; ++i) {
-        onAxis.add(float(i), 0, float(i), 0);
-        atOrigin.add(0, 0, 0, 0);
-        notANumber.add(kNan, float(i), 1, float(i * i));
-        plane.add(float(i), float(i * i % 5), 0, float(i), float(i % 3));
-    }
-    for (kelMatCorrespH* set : {&onAxis, &notANumber, &atOrigin}) {
-        kelMatEstimatorH H;
-        EXPECT_TRUE(H.estimate_byTaubin(*set));
-        EXPECT_EQ(H.m_Width, 3);
-        EXPECT_TRUE(std::isnan(H[0][0]));
-    }
-    kelMatEstimatorP P;
-    EXPECT_TRUE(P.estimate_byTaubin(plane));
-    EXPECT_EQ(P.m_Width, 4);
-    EXPECT_TRUE(std::isnan(P[0][0]));
-    testing::internal::GetCapturedStdout();
-}
-
 // As a product of matrices does.
-TEST(Fits, StopOnAnEstimatorOfAnotherSize) {
+TYPED_TEST(Correspondences, StopAnEstimatorOfAnotherSize) {
     std::mt19937 random = generator(79);
-    kelMatCorrespH h = pairs<Plane>(20, 0, 0, random);
-    kelMatCorrespP p = pairs<Space>(20, 0, 0, random);
+    typename TypeParam::Set set = pairs<TypeParam>(20, 0, 0, random);
+    typename TypeParam::Estimator other, plain;
+    other.create(4, 4, true);
     const char *const text = "this->m_Width == M.m_Height", *const file = "kelMat/src/kelMat.cpp",
                       *const product = "kelMat kelMat::operator*(const kelMat&) const";
-    kelMatEstimatorH H, plain;
-    H.create(4, 4, true);
-    EXPECT_STOPS(H.estimate_byLSM_fine(h), text, file, product);
-    EXPECT_STOPS(H.estimate_byRANSAC_fine(h, 2, nullptr), text, file, product);
-    kelMatEstimatorP P;
-    P.create(4, 4, true);
-    EXPECT_STOPS(P.estimate_byLSM_fine(p), text, file, product);
-    EXPECT_STOPS(P.estimate_byRANSAC_fine(p, 2), text, file, product);
-    H.create(4, 4, true);
-    H[3][3] = 0.5f;
-    plain.estimate_byLSM(h);
-    EXPECT_TRUE(H.estimate_byLSM(h)) << "rows at the matrix's own width";
-    for (int i = 0; i < 9; ++i)
-        EXPECT_NEAR(H[i / 3][i % 3] / H[2][2], plain[i / 3][i % 3], 1e-6 * std::fabs(plain[i / 3][i % 3]));
+    EXPECT_STOPS(other.estimate_byLSM_fine(set), text, file, product);
+    EXPECT_STOPS(TypeParam::ransac(other, set, 2, nullptr), text, file, product);
+    other[3][3] = 0.5f;
+    plain.estimate_byLSM(set);
+    EXPECT_TRUE(other.estimate_byLSM(set)) << "rows at the matrix's own width";
+    for (int r = 0; r < 3; ++r)
+        for (int c = 0; c < TypeParam::kColumns; ++c)
+            EXPECT_NEAR(other[r][c] / other[2][TypeParam::kColumns - 1], plain[r][c], 1e-6 * std::fabs(plain[r][c]));
 }
 
 TEST(RandomIndex, DrawsInOrderAndLetsTheThirdOfFourEqualTheFirst) {
@@ -301,7 +276,7 @@ TYPED_TEST(Correspondences, CountInliersStrictlyForEveryLength) {
         const Floats p = kel_ref::pairOf<TypeParam>(set, i);
         float u, v;
         TypeParam::project(transform, p, &u, &v);
-        const float error = std::hypot(p.end()[-2] - u, p.end()[-1] - v);
+        const float error = std::hypot(p[TypeParam::kColumns - 1] - u, p[TypeParam::kColumns] - v);
         for (float threshold : {std::nextafter(error, 0.0f), error, std::nextafter(error, 9.0f)})
             EXPECT_TRUE(agrees<TypeParam>(judge, set, M, threshold)) << i;
     }
