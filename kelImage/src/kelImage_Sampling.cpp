@@ -26,12 +26,21 @@ Sample sampleAt(kelValue_s32 x, float ratio) {
     return {index, position - static_cast<float>(index)};
 }
 
+// The index of that sample, in a source of that size; without floats, which cost a tenth of a small row.
+kelValue_s32 sampleIndex(kelValue_s32 i, kelValue_s32 ratio, kelValue_s32 size) {
+    return size < kExactSize ? i * ratio + ratio / 2 : sampleAt(i, static_cast<float>(ratio)).index;
+}
+
 // dst[x] = src[x * ratio + ratio / 2].
 template <class P> void decimateRow(const Kernels& kernels, P* dst, const P* src, ptrdiff_t width, ptrdiff_t ratio) {
+    auto* const to = reinterpret_cast<uint8_t*>(dst);
+    const auto* const sampled = reinterpret_cast<const uint8_t*>(src + ratio / 2);
     if (ratio == 1)
         memcpy(dst, src, width * sizeof(P));
     else if (ratio == 2)
-        kernels.oddPixels[sizeof(P) - 1](reinterpret_cast<uint8_t*>(dst), reinterpret_cast<const uint8_t*>(src), width);
+        kernels.oddPixels[sizeof(P) - 1](to, reinterpret_cast<const uint8_t*>(src), width);
+    else if (sizeof(P) == 1 && ratio <= 4)
+        kernels.averageOfFour(to, sampled, sampled, width, 0, ratio); // four times the same byte
     else
         for (ptrdiff_t x = 0; x < width; ++x)
             dst[x] = src[x * ratio + ratio / 2];
@@ -45,7 +54,7 @@ template <class P> void nearest(kelImage_t* dst, const kelImage_t* src) {
     const Kernels& kernels = kel::kernels();
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         P* const to = rowByWidth<P>(dst, y);
-        const P* const from = rowByWidth<P>(src, sampleAt(y, static_cast<float>(ry)).index);
+        const P* const from = rowByWidth<P>(src, sampleIndex(y, ry, src->height));
         if (src->width < kExactSize)
             decimateRow(kernels, to, from, dst->width, rx);
         else
