@@ -46,12 +46,11 @@ struct Ratio {
     int64_t weight(const Box& at, kelValue_s32 input) const { // 0 for inputs behind the last
         return input == at.first ? at.head : input < at.last ? repeat : input == at.last ? at.tail : 0;
     }
-    // Groups of so many inputs under any of the first `outputs` boxes.
-    kelValue_s32 groups(kelValue_s32 outputs, kelValue_s32 inputs) const {
-        kelValue_s32 most = 0;
-        for (kelValue_s32 i = 0; i < outputs; ++i)
-            most = std::max(most, at(i).last - at(i).first + 1);
-        return (most + inputs - 1) / inputs;
+    // Groups of so many inputs under a box at most: under one that begins with the last share of an input.
+    kelValue_s32 groups(kelValue_s32 inputs) const {
+        const int64_t share = (repeat | box) % 2 == 0 ? 2 : 1, // as the constructor leaves them
+            most = repeat > 0 ? (repeat - share + box - 1) / repeat + 1 : 0;
+        return static_cast<kelValue_s32>((most + inputs - 1) / inputs);
     }
 };
 
@@ -60,14 +59,13 @@ class Across {
 public:
     Across(const Kernels& kernels, kelValue_s32 outputs, kelValue_s32 inputs)
         : m_ratio(outputs, inputs), m_outputs(outputs), m_pitch(kel::wholeFours(outputs)),
-          m_together(m_ratio.box > kByteBox ? 4 : 2), m_groups(m_ratio.groups(outputs, m_together)),
+          m_together(m_ratio.box > kByteBox ? 4 : 2), m_groups(m_ratio.groups(m_together)),
           m_reduce(inputs < m_together || m_ratio.box > kWordBox ? nullptr
                    : m_together == 4                             ? kernels.reduceAcrossByWords
                                                                  : kernels.reduceAcrossByBytes) {
         if (m_reduce)
             fillTables(inputs);
     }
-    bool isHalf() const { return m_ratio.isHalf(); }
     void operator()(uint32_t* to, const uint32_t* from) const {
         if (m_reduce)
             return m_reduce(to, from, m_index.get(), m_weights.get(), m_groups, m_pitch, static_cast<uint32_t>(m_ratio.box));
@@ -119,22 +117,22 @@ private:
 class Down {
 public:
     Down(const Kernels& kernels, kelValue_s32 outputs, kelValue_s32 inputs)
-        : m_ratio(outputs, inputs), m_rows(2 * m_ratio.groups(outputs, 2)), m_row(allocate<const uint8_t*>(m_rows)),
+        : m_ratio(outputs, inputs), m_rows(2 * m_ratio.groups(2)), m_row(allocate<const uint8_t*>(m_rows)),
           m_weights(allocate<uint16_t>(m_rows)), m_reduce(m_ratio.box > kWordBox   ? nullptr
                                                           : m_ratio.box > kByteBox ? kernels.reduceDownByWords
                                                                                    : kernels.reduceDownByBytes) {}
-    bool isHalf() const { return m_ratio.isHalf(); }
-    kelValue_s32 rows() const { return m_rows; } // under a box at most
+    kelValue_s32 rows() const { return m_rows; } // under a box at most, by pairs
     kelValue_s32 lastOf(kelValue_s32 output) const { return m_ratio.at(output).last; }
 
     template <class RowAt> void operator()(uint8_t* to, kelValue_s32 output, ptrdiff_t bytes, RowAt rowAt) {
         const Box box = m_ratio.at(output);
-        for (kelValue_s32 k = 0; k < m_rows; ++k) { // behind the last, that one again without any weight
+        const kelValue_s32 pairs = (box.last - box.first) / 2 + 1;
+        for (kelValue_s32 k = 0; k < 2 * pairs; ++k) { // behind the last, that one again without any weight
             m_row[k] = reinterpret_cast<const uint8_t*>(rowAt(std::min(box.first + k, box.last)));
             m_weights[k] = static_cast<uint16_t>(m_ratio.weight(box, box.first + k));
         }
         if (m_reduce)
-            return m_reduce(to, m_row.get(), m_weights.get(), m_rows / 2, bytes, static_cast<uint32_t>(m_ratio.box));
+            return m_reduce(to, m_row.get(), m_weights.get(), pairs, bytes, static_cast<uint32_t>(m_ratio.box));
         for (ptrdiff_t i = 0; i < bytes; ++i) {
             int64_t sum = 0;
             for (kelValue_s32 k = box.first; k <= box.last; ++k)
@@ -162,10 +160,10 @@ void halveBothWays(const Kernels& kernels, kelImage_t* dst, const kelImage_t* sr
 
 void kel::reduce(kelImage_t* dst, const kelImage_t* src) {
     const Kernels& kernels = kel::kernels();
+    if (Ratio(dst->width, src->width).isHalf() && Ratio(dst->height, src->height).isHalf())
+        return ::halveBothWays(kernels, dst, src);
     const Across across(kernels, dst->width, src->width);
     Down down(kernels, dst->height, src->height);
-    if (across.isHalf() && down.isHalf())
-        return ::halveBothWays(kernels, dst, src);
     // A ring of reduced rows, large enough for those under one box.
     const ptrdiff_t pitch = wholeFours(dst->width);
     Buffer<uint32_t> ring = allocate<uint32_t>(down.rows() * pitch);
