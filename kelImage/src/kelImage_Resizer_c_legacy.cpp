@@ -45,18 +45,17 @@ void rightBandByStep(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size) 
 template <int N> void enborder(kelImage_t* dst, const kelImage_t* src, kelValue_s32 size) {
     const ptrdiff_t width = src->width;
     const kelValue_s32 height = src->height;
-    if (width > 0 && height > 0)
-        for (kelValue_s32 y = 0; y < dst->height; ++y)
-            memcpy(borderRow<N>(dst, y) + size, borderRow<N>(src, std::min(std::max(y - size, 0), height - 1)), width * N);
-    if (size < 1)
-        return;
     for (kelValue_s32 y = 0; y < dst->height; ++y) {
         Pixel<N>* const to = borderRow<N>(dst, y);
+        if (width > 0 && height > 0)
+            memcpy(to + size, borderRow<N>(src, std::min(std::max(y - size, 0), height - 1)), width * N);
+        if (size < 1)
+            continue;
         std::fill_n(to, size, to[size]);
         if (N != 2)
             std::fill_n(to + size + width, size, to[size + width - 1]);
     }
-    if (N == 2)
+    if (N == 2 && size > 0)
         rightBandByStep(dst, src, size);
 }
 
