@@ -8,16 +8,18 @@ namespace {
 
 using kel::row;
 
-// The common shape of the flips: row y of the destination is row y or H-1-y of the source, as it is or reversed.
+// The common shape of the flips: row y of the source goes to row y or H-1-y, as it is or reversed. The source is read in one
+// direction, which is what processors fetch ahead: from its end to its beginning where rows are reversed, as that reads them so.
 template <bool upsideDown, bool mirrored> void flip(kelImage_t* dst, const kelImage_t* src) {
     if (dst->width < 1)
         return;
     kel::withPixel(dst->type, [=](auto pixel) {
         constexpr int bytes = sizeof(pixel);
         const kel::Run reversed = kel::kernels().reversed[bytes - 1];
-        for (kelValue_s32 y = 0; y < dst->height; ++y) {
-            uint8_t* const to = row<uint8_t>(dst, y, bytes);
-            const uint8_t* const from = row<uint8_t>(src, upsideDown ? dst->height - 1 - y : y, bytes);
+        for (kelValue_s32 i = 0; i < dst->height; ++i) {
+            const kelValue_s32 y = mirrored ? dst->height - 1 - i : i;
+            uint8_t* const to = row<uint8_t>(dst, upsideDown ? dst->height - 1 - y : y, bytes);
+            const uint8_t* const from = row<uint8_t>(src, y, bytes);
             if (mirrored)
                 reversed(to, from, dst->width);
             else
