@@ -26,8 +26,8 @@ struct Lanes2 {
     static Lanes2 loadEights(const void* p, const int32_t* index, ptrdiff_t apart) {
         return of(Lanes1::loadEights(p, index, 0), Lanes1::loadEights(p, index + apart, 0));
     }
-    static Lanes2 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t apart) {
-        return of(Lanes1::load(p + index[0]), Lanes1::load(p + index[apart]));
+    static Lanes2 loadSixteens(const uint32_t* p, const int32_t* index) {
+        return of(Lanes1::load(p + index[0]), Lanes1::load(p + index[1]));
     }
     static Lanes2 zero() { return {_mm256_setzero_si256()}; }
     static Lanes2 bytes(int value) { return {_mm256_set1_epi8(static_cast<char>(value))}; }
@@ -225,6 +225,9 @@ inline Lanes2 oddLongs(Lanes2 a, Lanes2 b) {
 }
 inline Lanes2 ordered(Lanes2 ab) {
     return {_mm256_permute4x64_epi64(ab.v, _MM_SHUFFLE(3, 1, 2, 0))};
+}
+inline Lanes2 longsInTurn(Lanes2 a) {
+    return {_mm256_permutevar8x32_epi32(a.v, _mm256_setr_epi32(0, 4, 1, 5, 2, 6, 3, 7))};
 }
 inline Lanes2 narrowedWords(Lanes2 a, Lanes2 b) {
     return ordered(packWords(a, b));

@@ -33,9 +33,9 @@ struct Lanes4 {
         return of(Lanes1::loadEights(p, index, 0), Lanes1::loadEights(p, index + apart, 0),
                   Lanes1::loadEights(p, index + 2 * apart, 0), Lanes1::loadEights(p, index + 3 * apart, 0));
     }
-    static Lanes4 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t apart) {
-        return of(Lanes1::load(p + index[0]), Lanes1::load(p + index[apart]), Lanes1::load(p + index[2 * apart]),
-                  Lanes1::load(p + index[3 * apart]));
+    static Lanes4 loadSixteens(const uint32_t* p, const int32_t* index) {
+        return of(Lanes1::load(p + index[0]), Lanes1::load(p + index[1]), Lanes1::load(p + index[2]),
+                  Lanes1::load(p + index[3]));
     }
     static Lanes4 zero() { return {_mm512_setzero_si512()}; }
     static Lanes4 bytes(int value) { return {_mm512_set1_epi8(static_cast<char>(value))}; }
@@ -259,6 +259,9 @@ inline Lanes4 oddLongs(Lanes4 a, Lanes4 b) {
 }
 inline Lanes4 ordered(Lanes4 ab) {
     return {_mm512_permutexvar_epi64(_mm512_setr_epi64(0, 2, 4, 6, 1, 3, 5, 7), ab.v)};
+}
+inline Lanes4 longsInTurn(Lanes4 a) {
+    return {_mm512_permutexvar_epi32(_mm512_setr_epi32(0, 4, 8, 12, 1, 5, 9, 13, 2, 6, 10, 14, 3, 7, 11, 15), a.v)};
 }
 inline Lanes4 narrowedWords(Lanes4 a, Lanes4 b) {
     return ordered(packWords(a, b));

@@ -47,7 +47,7 @@ struct Lanes1 {
         const auto* const base = static_cast<const uint8_t*>(p);
         return vcombine_u8(vld1_u8(base + 4 * ptrdiff_t(index[0])), vld1_u8(base + 4 * ptrdiff_t(index[1])));
     }
-    static Lanes1 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t) { return load(p + index[0]); }
+    static Lanes1 loadSixteens(const uint32_t* p, const int32_t* index) { return load(p + index[0]); }
     static Lanes1 zero() { return vdupq_n_u8(0); }
     static Lanes1 bytes(int value) { return vdupq_n_u8(static_cast<uint8_t>(value)); }
     static Lanes1 words(int value) { return vdupq_n_u16(static_cast<uint16_t>(value)); }

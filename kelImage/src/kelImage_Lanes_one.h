@@ -38,6 +38,10 @@ inline Lanes1 reversedLanes(Lanes1 a) {
 inline Lanes1 ordered(Lanes1 ab) {
     return ab;
 }
+// The first longs of all lanes, then all second ones, and so on.
+inline Lanes1 longsInTurn(Lanes1 a) {
+    return a;
+}
 // Words that are not negative, narrowed in the order of memory.
 inline Lanes1 narrowedWords(Lanes1 a, Lanes1 b) {
     return packWords(a, b);

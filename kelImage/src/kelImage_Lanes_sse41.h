@@ -47,7 +47,7 @@ struct Lanes1 {
         return {_mm_unpacklo_epi64(first, second)};
     }
     // Lane k from p + 4 * index[k * apart].
-    static Lanes1 loadSixteens(const uint32_t* p, const int32_t* index, ptrdiff_t) { return load(p + index[0]); }
+    static Lanes1 loadSixteens(const uint32_t* p, const int32_t* index) { return load(p + index[0]); }
     static Lanes1 zero() { return {_mm_setzero_si128()}; }
     static Lanes1 bytes(int value) { return {_mm_set1_epi8(static_cast<char>(value))}; }
     static Lanes1 words(int value) { return {_mm_set1_epi16(static_cast<short>(value))}; }

@@ -74,12 +74,12 @@ public:
     }
 
 private:
-    // Every group of inputs of every output: where it starts, and its weights side by side, bytes of a pair four times. The last
-    // input comes as the last of its group, so that nothing behind it is read.
+    // Every group of inputs of every output: where it starts, and its weights side by side, bytes of a pair or words of either half
+    // of four inputs, four times. The last input comes as the last of its group, so that nothing behind it is read.
     void fillTables(kelValue_s32 inputs) {
         const ptrdiff_t count = m_groups * m_pitch;
         m_index = allocate<int32_t>(count);
-        m_weights = allocate<uint16_t>(4 * count);
+        m_weights = allocate<uint16_t>((m_together == 4 ? 16 : 4) * count);
         for (ptrdiff_t i = 0; i < count; ++i) {
             const Box box = m_ratio.at(static_cast<kelValue_s32>(std::min<ptrdiff_t>(i % m_pitch, m_outputs - 1)));
             const int64_t wanted = box.first + m_together * (i / m_pitch),
@@ -88,9 +88,12 @@ private:
                 return static_cast<uint16_t>(k < wanted ? 0 : m_ratio.weight(box, static_cast<kelValue_s32>(k)));
             };
             m_index[i] = static_cast<int32_t>(index);
-            for (ptrdiff_t k = 0; k < 4; ++k)
-                m_weights[4 * i + k] =
-                    static_cast<uint16_t>(m_together == 4 ? weight(index + k) : weight(index) | weight(index + 1) << 8);
+            if (m_together == 2)
+                std::fill_n(&m_weights[4 * i], 4, static_cast<uint16_t>(weight(index) | weight(index + 1) << 8));
+            else
+                for (ptrdiff_t half = 0; half < 2; ++half)
+                    for (ptrdiff_t k = 0; k < 8; ++k)
+                        m_weights[8 * (i + (i / m_pitch + half) * m_pitch) + k] = weight(index + 2 * half + k % 2);
         }
     }
     uint32_t plainAverage(const uint32_t* from, const Box& box) const {

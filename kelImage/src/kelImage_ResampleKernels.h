@@ -85,6 +85,7 @@ void mixRows(uint8_t* d, const uint8_t* above, const uint8_t* below, int weight,
 // Weights up to 16: sums are words of at most 255 * 16. Groups are pairs, their weights two bytes, four times. Division by the box
 // is a multiplication with its reciprocal, rounded up: exact while 255 * box * box < 2^16.
 struct WordBox {
+    static constexpr ptrdiff_t kWeights = 4; // words of them for a pixel
     uint32_t reciprocal;
     explicit WordBox(uint32_t box) : reciprocal((65536 + box - 1) / box) {}
 
@@ -118,31 +119,30 @@ private:
     template <class V> V divided(V sums) const { return mulHighWords(sums, V::words(static_cast<int>(reciprocal))); }
 };
 
-// One pixel of four and its neighbour side by side as words of four channels, and their weights of four.
+// One pixel of four and its neighbour side by side as words of four channels.
 template <int first>
 constexpr Sixteen kWordsSideBySide = {
     {first, -1, first + 4, -1, first + 1, -1, first + 5, -1, first + 2, -1, first + 6, -1, first + 3, -1, first + 7, -1}};
-template <int n>
-constexpr Sixteen kLong = {{n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3, n, n + 1, n + 2, n + 3}};
-
-// Weights and the box are even, the box up to 8206, and so are sums, longs below 2^21. Groups are fours. One more than a sum over the box
+// Weights and the box are even, the box up to 8206, and so are sums, longs below 2^21. Groups are fours: weights of their first two inputs, and behind those of all pixels the ones of the other two. One more than a sum over the box
 // is off by less than 256 / 2^22 in single precision, however the thread rounds, and 1 / 8206 or more from whole numbers.
 struct LongBox {
+    static constexpr ptrdiff_t kWeights = 8;
     float reciprocal;
     explicit LongBox(uint32_t box) : reciprocal(1 / static_cast<float>(box)) {}
 
     template <class V>
     V across(const uint32_t* s, const int32_t* index, const uint16_t* weights, ptrdiff_t fours, ptrdiff_t pitch) const {
-        V a = V::zero(), b = a, c = a, d = a;
-        for (ptrdiff_t k = 0; k < fours; ++k, index += pitch, weights += 4 * pitch) {
-            const auto* const w = reinterpret_cast<const uint8_t*>(weights);
-            const V ofAB = V::loadLanes(w, 32), ofCD = V::loadLanes(w + 16, 32);
-            a = addLongs(a, weighedFour<0>(V::loadSixteens(s, index, 4), ofAB));
-            b = addLongs(b, weighedFour<8>(V::loadSixteens(s, index + 1, 4), ofAB));
-            c = addLongs(c, weighedFour<0>(V::loadSixteens(s, index + 2, 4), ofCD));
-            d = addLongs(d, weighedFour<8>(V::loadSixteens(s, index + 3, 4), ofCD));
-        }
-        return packWords(packLongs(divided(a), divided(b)), packLongs(divided(c), divided(d)));
+        const V zero = V::zero();
+        V sums[4] = {zero, zero, zero, zero}; // a pixel a lane
+        for (ptrdiff_t k = 0; k < fours; ++k, index += pitch, weights += 2 * kWeights * pitch)
+            for (ptrdiff_t j = 0; j < 4; ++j) {
+                const uint16_t* const w = weights + kWeights * j * V::kLanes;
+                const V pixels = V::loadSixteens(s, index + j * V::kLanes);
+                const V firstTwo = weighWords(shuffle(pixels, V::every(kWordsSideBySide<0>)), V::load(w)),
+                        lastTwo = weighWords(shuffle(pixels, V::every(kWordsSideBySide<8>)), V::load(w + kWeights * pitch));
+                sums[j] = addLongs(sums[j], addLongs(firstTwo, lastTwo));
+            }
+        return longsInTurn(inBytes(sums));
     }
     template <class V> V down(const uint8_t* const* row, const uint16_t* weights, ptrdiff_t pairs, ptrdiff_t i) const {
         const V zero = V::zero();
@@ -154,13 +154,12 @@ struct LongBox {
             for (int j = 0; j < 4; ++j)
                 sums[j] = addLongs(sums[j], weighWords(words[j], w));
         }
-        return packWords(packLongs(divided(sums[0]), divided(sums[1])), packLongs(divided(sums[2]), divided(sums[3])));
+        return inBytes(sums);
     }
 
 private:
-    template <int n, class V> static V weighedFour(V pixels, V weights) {
-        return addLongs(weighWords(shuffle(pixels, V::every(kWordsSideBySide<0>)), shuffle(weights, V::every(kLong<n>))),
-                        weighWords(shuffle(pixels, V::every(kWordsSideBySide<8>)), shuffle(weights, V::every(kLong<n + 4>))));
+    template <class V> V inBytes(const V* sums) const {
+        return packWords(packLongs(divided(sums[0]), divided(sums[1])), packLongs(divided(sums[2]), divided(sums[3])));
     }
     template <class V> V divided(V sums) const { return truncated(timesDifference(sums, -1, reciprocal)); }
 };
@@ -172,7 +171,7 @@ void reduceAcross(uint32_t* d, const uint32_t* s, const int32_t* index, const ui
                   ptrdiff_t width, uint32_t box) {
     const Box by(box);
     walkColumns<4>(0, width, [=](auto of, ptrdiff_t i) {
-        store(d + i, by.template across<LanesOf<decltype(of)>>(s, index + i, weights + 4 * i, groups, width));
+        store(d + i, by.template across<LanesOf<decltype(of)>>(s, index + i, weights + Box::kWeights * i, groups, width));
     });
 }
 
