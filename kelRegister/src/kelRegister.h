@@ -23,12 +23,16 @@
 
 namespace kelRegister {
 
-/** What a registration may be told; the defaults suit photographs. */
+/**
+ * What a registration may be told; the defaults suit photographs. One out of its range is refused in words, also where it does
+ * not count.
+ */
 struct Options {
     float threshold;  ///< Inlier distance in pixels of the coarser working picture, 0.1 to 100; 3.
     int mostFeatures; ///< Most keypoints of a picture, 50 to 5000; 1200. Each gives a feature for every prevailing direction.
-    int workingSize;  ///< Pictures are halved until their longer side is at most this, 200 to 8000; 1000.
-    bool views;       ///< Whether squeezed views of both are tried where the first attempt is refused (steep tilts); true.
+    /// Pictures are halved until their longer side is at most this, or the shorter one is below 80 pixels; 200 to 8000; 1000.
+    int workingSize;
+    bool views; ///< Whether squeezed views of both are tried where the first attempt is refused (steep tilts); true.
 
     Options() : threshold(3), mostFeatures(1200), workingSize(1000), views(true) {}
 };
@@ -88,8 +92,8 @@ KEL_API std::vector<Feature> findFeatures(const kelImage_t* picture, const Optio
 
 /**
  * Pairs of features that are each other's nearest by the sum of absolute differences, nearer than 0.95 times the next one at
- * another place, seen from either side. Of several pairs that join the same two places the nearest is kept. Marks nothing as
- * inlier.
+ * another place, seen from either side; where places overlap in a chain, their order decides which is another. Of several pairs
+ * that join the same two places the nearest is kept. Marks nothing as inlier.
  */
 KEL_API std::vector<Match> matchFeatures(const std::vector<Feature>& first, const std::vector<Feature>& second);
 

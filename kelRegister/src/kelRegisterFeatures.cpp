@@ -52,10 +52,11 @@ std::vector<Candidate> strongest(std::vector<Candidate> candidates, int width, i
     std::vector<Candidate> chosen, rest;
     for (const Candidate& c : candidates) {
         const bool ofFew = ofCell[cellOf(c)]++ < cellShare, ofSmall = ofLevel[c.level]++ < levelShare;
-        (ofFew || ofSmall ? chosen : rest).push_back(c);
+        const bool isRoom = static_cast<int>(chosen.size()) < most; // the shares of cells and levels may come to more
+        (isRoom && (ofFew || ofSmall) ? chosen : rest).push_back(c);
     }
-    const size_t room = static_cast<size_t>(std::max(0, most - static_cast<int>(chosen.size())));
-    chosen.insert(chosen.end(), rest.begin(), rest.begin() + static_cast<ptrdiff_t>(std::min(room, rest.size())));
+    const ptrdiff_t room = most - static_cast<ptrdiff_t>(chosen.size());
+    chosen.insert(chosen.end(), rest.begin(), rest.begin() + room);
     // Level by level, so that the gradients of one level are there at a time.
     std::stable_sort(chosen.begin(), chosen.end(), [](const Candidate& a, const Candidate& b) { return a.level < b.level; });
     return chosen;

@@ -75,6 +75,13 @@ Image greyOf(const kelImage_t* picture) {
         convertKelImage(grey.get(), colours.get());
     } else if (picture->type == KEL_PIXEL_TYPE_U8G) {
         loadKelImageData(grey.get(), picture->data, picture->width, picture->height, picture->step);
+    } else if (picture->type == KEL_PIXEL_TYPE_U8YUV) { // libkel's converter takes rows to be as far apart as in `grey`
+        for (int y = 0; y < grey->height; ++y) {
+            const uint8_t* const from = rowOf(picture, y);
+            uint8_t* const to = grey.row(y);
+            for (int x = 0; x < grey->width; ++x)
+                to[x] = from[2 * x + 1];
+        }
     } else {
         convertKelImage(grey.get(), picture);
     }
