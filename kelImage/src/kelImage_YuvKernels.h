@@ -1,7 +1,8 @@
 // Kernels of YUV: its luma, and its colour in single precision. With U' = U - 128 and V' = V - 128:
 //   C = (Y - 16) * kLuma, R = C + kRedV * V', G = C + kGreenU * U' + kGreenV * V', B = C + kBlueU * U',
 // each product rounded to single precision. Four channels sum up the chroma of G first and round by the thread's mode; three
-// channels sum up from left to right and truncate: callers rely on either. Integers give the bytes of three channels faster.
+// channels sum up from left to right and truncate: callers rely on either. Integers give the bytes of three channels faster, not
+// those of four: there sums of every channel that end in a half would have to be found and go through floats.
 #ifndef KEL_IMAGE_YUV_KERNELS_H
 #define KEL_IMAGE_YUV_KERNELS_H
 
