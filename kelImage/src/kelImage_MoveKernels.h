@@ -22,6 +22,7 @@ template <int N> constexpr Sixteen kReversed = reversedPixels<N>();
 // the destination's, too.
 template <class V, int N> void reverseBlocks(uint8_t* d, const uint8_t* s, ptrdiff_t& x, ptrdiff_t width) {
     constexpr ptrdiff_t pixels = N == 3 ? V::kThrees : V::kBytes / N, spare = N == 3;
+#pragma GCC unroll 4
     for (; x + pixels + spare <= width; x += pixels) {
         const uint8_t* const from = s + N * (width - pixels - x);
         if constexpr (N == 3)
