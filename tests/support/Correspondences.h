@@ -113,20 +113,20 @@ template <class Kind> const std::vector<SetOperation<Kind>>& setOperations() {
          [](Set s, Estimator M, float) { return results(kel_ref::taubin<Kind>(M, s), M); }},
         {"judgeInliers",
          [](Set s, Estimator M, float threshold) {
-             std::vector<bool> mask(s.m_Num + 3, true);
+             std::vector<bool> mask(s.m_Num + 3, s.m_Num % 2 == 0);
              return results(judgeInliers(M, s, mask, threshold), mask);
          },
          [](Set s, Estimator M, float threshold) {
-             std::vector<bool> mask(s.m_Num + 3, true);
+             std::vector<bool> mask(s.m_Num + 3, s.m_Num % 2 == 0);
              return results(kel_ref::inliers<Kind>(M, s, mask, threshold), mask);
          }},
         {"estimate_byRANSAC_fine",
          [](Set s, Estimator M, float threshold) {
-             int inliers = -1;
+             int inliers = -5;
              return results(Kind::ransac(M, s, threshold, &inliers), inliers, M);
          },
          [](Set s, Estimator M, float threshold) {
-             int inliers = -1;
+             int inliers = -5;
              return results(kel_ref::ransac<Kind>(M, s, threshold, Kind::kCounts ? &inliers : nullptr), inliers, M);
          }},
     };
