@@ -1,5 +1,5 @@
-// The matrix kernels written plainly: every loop in the textbook order. With T = float the results are the library's own bit
-// for bit; with T = double they serve as truth.
+// The matrix kernels written plainly: every loop in the textbook order. Results are the library's own bit for bit. Sums and products
+// are there in double precision, too, for what is true.
 #ifndef KEL_TESTS_MAT_REFERENCE_H
 #define KEL_TESTS_MAT_REFERENCE_H
 
@@ -44,46 +44,47 @@ template <class T> Mat<T> operator*(const Mat<T>& A, const Mat<T>& B) {
     return R;
 }
 
-template <class T> T sign(T x) {
-    return x >= 0 ? T(1) : T(-1);
+using Matrix = Mat<float>;
+
+inline float sign(float x) {
+    return x >= 0 ? 1.0f : -1.0f;
 }
 
-template <class T> T pythag(T a, T b) {
-    const T A = std::fabs(a), B = std::fabs(b);
-    if (A > B) {
-        const T r = B / A, q = r * r + T(1);
-        return static_cast<T>(static_cast<double>(A) * std::sqrt(static_cast<double>(q)));
-    }
-    if (B == 0)
+// Where one is NaN the second counts as the longer.
+inline float pythag(float a, float b) {
+    float longer = std::fabs(a), shorter = std::fabs(b);
+    if (!(longer > shorter))
+        std::swap(longer, shorter);
+    if (longer == 0)
         return 0;
-    const T r = A / B, q = r * r + T(1);
-    return static_cast<T>(static_cast<double>(B) * std::sqrt(static_cast<double>(q)));
+    const float ratio = shorter / longer, q = ratio * ratio + 1.0f;
+    return static_cast<float>(static_cast<double>(longer) * std::sqrt(static_cast<double>(q)));
 }
 
 // Crout, column by column.
-template <class T> bool nr_ludcmp(Mat<T>& a, int* indx, T* d) {
+inline bool nr_ludcmp(Matrix& a, int* indx, float* d) {
     const int n = a.columns;
     *d = 1;
-    std::vector<T> vv(n);
+    std::vector<float> vv(n);
     for (int i = 0; i < n; ++i) {
-        T big = 0;
+        float big = 0;
         for (int j = 0; j < n; ++j)
             if (std::fabs(a[i][j]) > big)
                 big = std::fabs(a[i][j]);
         if (big == 0)
             return false;
-        vv[i] = T(1) / big;
+        vv[i] = 1.0f / big;
     }
     int imax = 0;
     for (int j = 0; j < n; ++j) {
         for (int i = 0; i < j; ++i)
             for (int k = 0; k < i; ++k)
                 a[i][j] = a[i][j] - a[i][k] * a[k][j];
-        T big = 0;
+        float big = 0;
         for (int i = j; i < n; ++i) {
             for (int k = 0; k < j; ++k)
                 a[i][j] = a[i][j] - a[i][k] * a[k][j];
-            const T dum = vv[i] * std::fabs(a[i][j]);
+            const float dum = vv[i] * std::fabs(a[i][j]);
             if (dum >= big) {
                 big = dum;
                 imax = i;
@@ -97,9 +98,9 @@ template <class T> bool nr_ludcmp(Mat<T>& a, int* indx, T* d) {
         }
         indx[j] = imax;
         if (a[j][j] == 0)
-            a[j][j] = T(1.0e-40f);
+            a[j][j] = 1.0e-40f;
         if (j != n - 1) {
-            const T dum = T(1) / a[j][j];
+            const float dum = 1.0f / a[j][j];
             for (int i = j + 1; i < n; ++i)
                 a[i][j] = a[i][j] * dum;
         }
@@ -107,13 +108,13 @@ template <class T> bool nr_ludcmp(Mat<T>& a, int* indx, T* d) {
     return true;
 }
 
-template <class T> void nr_lubksb(const Mat<T>& a, const int* indx, T* b) {
+inline void nr_lubksb(const Matrix& a, const int* indx, float* b) {
     const int n = a.columns;
     bool set = false;
     int ii = 0;
     for (int i = 0; i < n; ++i) {
         const int ip = indx[i];
-        T sum = b[ip];
+        float sum = b[ip];
         b[ip] = b[i];
         if (set)
             for (int k = ii; k <= i - 1; ++k)
@@ -125,25 +126,25 @@ template <class T> void nr_lubksb(const Mat<T>& a, const int* indx, T* b) {
         b[i] = sum;
     }
     for (int i = n - 1; i >= 0; --i) {
-        T sum = b[i];
+        float sum = b[i];
         for (int k = i + 1; k < n; ++k)
             sum = sum - a[i][k] * b[k];
         b[i] = sum / a[i][i];
     }
 }
 
-template <class T> T determinant(const Mat<T>& A) {
+inline float determinant(const Matrix& A) {
     const int n = A.columns;
     if (n == 2)
         return A[0][0] * A[1][1] - A[0][1] * A[1][0];
     if (n == 3) {
-        const T top = (A[1][0] * A[2][1] - A[1][1] * A[2][0]) * A[0][2];
-        const T middle = (A[2][0] * A[0][1] - A[2][1] * A[0][0]) * A[1][2] + top;
+        const float top = (A[1][0] * A[2][1] - A[1][1] * A[2][0]) * A[0][2];
+        const float middle = (A[2][0] * A[0][1] - A[2][1] * A[0][0]) * A[1][2] + top;
         return (A[0][0] * A[1][1] - A[0][1] * A[1][0]) * A[2][2] + middle;
     }
     std::vector<int> indx(n);
-    Mat<T> LU = A;
-    T product;
+    Matrix LU = A;
+    float product;
     nr_ludcmp(LU, indx.data(), &product);
     for (int i = 0; i < n; ++i)
         product *= LU[i][i];
@@ -151,13 +152,13 @@ template <class T> T determinant(const Mat<T>& A) {
 }
 
 // For orders 2 and 3.
-template <class T> Mat<T> adjugate(const Mat<T>& A) {
+inline Matrix adjugate(const Matrix& A) {
     if (A.columns == 2) {
-        Mat<T> R(2, 2);
+        Matrix R(2, 2);
         R.data = {A[1][1], -A[0][1], -A[1][0], A[0][0]};
         return R;
     }
-    Mat<T> R(3, 3);
+    Matrix R(3, 3);
     for (int i = 0; i < 3; ++i)
         for (int j = 0; j < 3; ++j) {
             const int r = (j + 1) % 3, rr = (j + 2) % 3, c = (i + 1) % 3, cc = (i + 2) % 3;
@@ -166,25 +167,25 @@ template <class T> Mat<T> adjugate(const Mat<T>& A) {
     return R;
 }
 
-template <class T> bool inverse(const Mat<T>& A, Mat<T>& R) {
+inline bool inverse(const Matrix& A, Matrix& R) {
     const int n = A.columns;
     if (n <= 3) {
-        const T det = determinant(A);
+        const float det = determinant(A);
         if (det == 0)
             return false;
         R = adjugate(A);
-        for (T& x : R.data)
+        for (float& x : R.data)
             x /= det;
         return true;
     }
     std::vector<int> indx(n);
-    Mat<T> LU = A;
-    T d;
+    Matrix LU = A;
+    float d;
     if (!nr_ludcmp(LU, indx.data(), &d))
         return false;
-    R = Mat<T>(n, n);
+    R = Matrix(n, n);
     for (int j = 0; j < n; ++j) {
-        std::vector<T> column(n);
+        std::vector<float> column(n);
         column[j] = 1;
         nr_lubksb(LU, indx.data(), column.data());
         for (int i = 0; i < n; ++i)
@@ -193,19 +194,19 @@ template <class T> bool inverse(const Mat<T>& A, Mat<T>& R) {
     return true;
 }
 
-template <class T> bool pseudoInverse(const Mat<T>& A, Mat<T>& R) {
-    Mat<T> Q;
+inline bool pseudoInverse(const Matrix& A, Matrix& R) {
+    Matrix Q;
     const bool regular = inverse(transposed(A) * A, Q);
     if (regular)
         R = Q * transposed(A);
     return regular;
 }
 
-template <class T> bool nr_choldc(Mat<T>& a) {
+inline bool nr_choldc(Matrix& a) {
     const int n = a.columns;
     for (int i = 0; i < n; ++i)
         for (int j = 0; j <= i; ++j) {
-            T s = a[i][j];
+            float s = a[i][j];
             for (int k = 0; k < j; ++k)
                 s = s - (a[i][k] * a[j][k]) / a[k][k];
             if (j == i && 0 >= s)
@@ -224,42 +225,42 @@ template <class T> bool nr_choldc(Mat<T>& a) {
 }
 
 // x' = x c + y s, y' = y c - x s on columns p and q.
-template <class T> void rotateColumns(Mat<T>& M, int p, int q, T c, T s) {
+inline void rotateColumns(Matrix& M, int p, int q, float c, float s) {
     for (int r = 0; r < M.rows; ++r) {
-        const T x = M[r][p], y = M[r][q];
+        const float x = M[r][p], y = M[r][q];
         M[r][p] = x * c + y * s;
         M[r][q] = y * c - x * s;
     }
 }
 
 // What is left of a row or a column from one of its elements on.
-template <class T> struct Line {
-    T* data;
+struct Line {
+    float* data;
     ptrdiff_t first, step;
     int length;
 
-    T& operator[](int i) const { return data[first + i * step]; }
+    float& operator[](int i) const { return data[first + i * step]; }
 };
-template <class T> Line<T> row(Mat<T>& M, ptrdiff_t r, int c) {
+inline Line row(Matrix& M, ptrdiff_t r, int c) {
     return {M.data.data(), r * M.columns + c, 1, M.columns - c};
 }
-template <class T> Line<T> column(Mat<T>& M, int c, int r) {
+inline Line column(Matrix& M, int c, int r) {
     return {M.data.data(), r * static_cast<ptrdiff_t>(M.columns) + c, M.columns, M.rows - r};
 }
-template <class T> T dot(Line<T> x, Line<T> y) {
-    T sum = 0;
+inline float dot(Line x, Line y) {
+    float sum = 0;
     for (int i = 0; i < x.length; ++i)
         sum += x[i] * y[i];
     return sum;
 }
-template <class T> void addMultiple(Line<T> to, T factor, Line<T> from) {
+inline void addMultiple(Line to, float factor, Line from) {
     for (int i = 0; i < to.length; ++i)
         to[i] += factor * from[i];
 }
 
 // The Householder vector in place of x, apply(h) for what it is to reflect, and what the first element of x becomes; 0 for zeros.
-template <class T, class Apply> T reflect(Line<T> x, Apply apply) {
-    T scale = 0, s = 0;
+template <class Apply> float reflect(Line x, Apply apply) {
+    float scale = 0, s = 0;
     for (int i = 0; i < x.length; ++i)
         scale += std::fabs(x[i]);
     if (scale == 0)
@@ -268,7 +269,7 @@ template <class T, class Apply> T reflect(Line<T> x, Apply apply) {
         x[i] /= scale;
         s += x[i] * x[i];
     }
-    const T f = x[0], g = -(sign(f) * std::sqrt(s));
+    const float f = x[0], g = -(sign(f) * std::sqrt(s));
     x[0] = f - g;
     apply(f * g - s);
     for (int i = 0; i < x.length; ++i)
@@ -276,34 +277,34 @@ template <class T, class Apply> T reflect(Line<T> x, Apply apply) {
     return scale * g;
 }
 
-template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>& v) {
+inline bool nr_svdcmp(const Matrix& a, Matrix& u, Matrix& W, Matrix& v) {
     const int m = a.rows, n = a.columns;
     u = a;
-    v = Mat<T>(n, n);
-    W = Mat<T>(n, n);
-    std::vector<T> w(n), e(n + 1), scaled(n); // diagonal, superdiagonal from e[1] on
-    T norm = 0;
+    v = Matrix(n, n);
+    W = Matrix(n, n);
+    std::vector<float> w(n), e(n + 1), scaled(n); // diagonal, superdiagonal from e[1] on
+    float norm = 0;
     for (int i = 0; i < n; ++i) {
         if (i < m) {
-            const Line<T> below = column(u, i, i), beside = row(u, i, i + 1), direction = {scaled.data(), 0, 1, n - i - 1};
-            w[i] = reflect(below, [&](T h) {
+            const Line below = column(u, i, i), beside = row(u, i, i + 1), direction = {scaled.data(), 0, 1, n - i - 1};
+            w[i] = reflect(below, [&](float h) {
                 for (int c = i + 1; c < n; ++c)
                     addMultiple(column(u, c, i), dot(below, column(u, c, i)) / h, below);
             });
-            e[i + 1] = reflect(beside, [&](T h) {
+            e[i + 1] = reflect(beside, [&](float h) {
                 for (int c = 0; c < beside.length; ++c)
                     direction[c] = beside[c] / h;
                 for (int r = i + 1; r < m; ++r)
                     addMultiple(row(u, r, i + 1), dot(row(u, r, i + 1), beside), direction);
             });
         }
-        const T size = std::fabs(w[i]) + std::fabs(e[i]);
+        const float size = std::fabs(w[i]) + std::fabs(e[i]);
         norm = norm > size ? norm : size;
     }
 
     for (int i = n - 1; i >= 0; --i) {
         if (e[i + 1] != 0) {
-            const Line<T> beside = row(u, i, i + 1), below = column(v, i, i + 1);
+            const Line beside = row(u, i, i + 1), below = column(v, i, i + 1);
             for (int k = 0; k < beside.length; ++k)
                 below[k] = (beside[k] / beside[0]) / e[i + 1];
             for (int c = i + 1; c < n; ++c)
@@ -317,14 +318,14 @@ template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>&
     for (int i = (m < n ? m : n) - 1; i >= 0; --i) {
         for (int c = i + 1; c < n; ++c)
             u[i][c] = 0;
-        const Line<T> whole = column(u, i, i), rest = column(u, i, i + 1);
-        const T reciprocal = T(1) / w[i];
+        const Line whole = column(u, i, i), rest = column(u, i, i + 1);
+        const float reciprocal = 1.0f / w[i];
         if (w[i] != 0)
             for (int c = i + 1; c < n; ++c)
                 addMultiple(column(u, c, i), (dot(rest, column(u, c, i + 1)) / u[i][i]) * reciprocal, whole);
         for (int r = 0; r < whole.length; ++r)
-            whole[r] = w[i] == 0 ? T(0) : whole[r] * reciprocal;
-        u[i][i] += T(1);
+            whole[r] = w[i] == 0 ? 0.0f : whole[r] * reciprocal;
+        u[i][i] += 1.0f;
     }
 
     bool converged = true;
@@ -341,13 +342,13 @@ template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>&
                 }
             }
             if (cancel) {
-                T c = 0, s = 1;
+                float c = 0, s = 1;
                 for (int i = l; i <= k; ++i) {
-                    const T f = s * e[i];
+                    const float f = s * e[i];
                     e[i] = c * e[i];
                     if (std::fabs(f) + norm == norm)
                         break;
-                    const T g = w[i], h = pythag(f, g), reciprocal = T(1) / h;
+                    const float g = w[i], h = pythag(f, g), reciprocal = 1.0f / h;
                     w[i] = h;
                     c = g * reciprocal;
                     s = -f * reciprocal;
@@ -366,11 +367,11 @@ template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>&
                 converged = false;
                 break;
             }
-            T x = w[l], y = w[k - 1], z = w[k], g = e[k - 1], h = e[k];
-            T f = ((y - z) * (y + z) + (g - h) * (g + h)) / (T(2) * h * y);
-            g = pythag(f, T(1));
+            float x = w[l], y = w[k - 1], z = w[k], g = e[k - 1], h = e[k];
+            float f = ((y - z) * (y + z) + (g - h) * (g + h)) / (2.0f * h * y);
+            g = pythag(f, 1.0f);
             f = ((x - z) * (x + z) + h * ((y / (f + sign(f) * g)) - h)) / x;
-            T c = 1, s = 1;
+            float c = 1, s = 1;
             for (int j = l; j <= k - 1; ++j) {
                 g = c * e[j + 1];
                 h = s * e[j + 1];
@@ -387,7 +388,7 @@ template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>&
                 z = pythag(f, h);
                 w[j] = z;
                 if (z != 0) {
-                    z = T(1) / z;
+                    z = 1.0f / z;
                     c = f * z;
                     s = h * z;
                 }
@@ -404,25 +405,25 @@ template <class T> bool nr_svdcmp(const Mat<T>& a, Mat<T>& u, Mat<T>& W, Mat<T>&
     return converged;
 }
 
-template <class T> bool nr_jacobi(Mat<T>& a, Mat<T>& d, Mat<T>& v, int* nrot) {
+inline bool nr_jacobi(Matrix& a, Matrix& d, Matrix& v, int* nrot) {
     const int n = a.columns;
-    d = Mat<T>(n, 1);
-    v = identity<T>(n);
-    std::vector<T> b(n), z(n);
+    d = Matrix(n, 1);
+    v = identity<float>(n);
+    std::vector<float> b(n), z(n);
     for (int i = 0; i < n; ++i)
         b[i] = d[i][0] = a[i][i];
     *nrot = 0;
     for (int sweep = 0; sweep < 50; ++sweep) {
-        T sm = 0;
+        float sm = 0;
         for (int p = 0; p < n; ++p)
             for (int q = p + 1; q < n; ++q)
                 sm += std::fabs(a[p][q]);
         if (sm == 0)
             return true;
-        const T tresh = sweep <= 3 ? T(0.2f) * sm / T(n * n) : T(0);
+        const float tresh = sweep <= 3 ? 0.2f * sm / static_cast<float>(n * n) : 0.0f;
         for (int p = 0; p < n; ++p)
             for (int q = p + 1; q < n; ++q) {
-                const T g = T(100) * std::fabs(a[p][q]);
+                const float g = 100.0f * std::fabs(a[p][q]);
                 const double dp = std::fabs(d[p][0]), dq = std::fabs(d[q][0]), gg = g;
                 if (sweep > 4 && dp + gg == dp && dq + gg == dq) {
                     a[p][q] = 0;
@@ -430,26 +431,26 @@ template <class T> bool nr_jacobi(Mat<T>& a, Mat<T>& d, Mat<T>& v, int* nrot) {
                 }
                 if (!(std::fabs(a[p][q]) > tresh))
                     continue;
-                T h = d[q][0] - d[p][0], t;
+                float h = d[q][0] - d[p][0], t;
                 const double hh = std::fabs(h);
                 if (hh + gg == hh)
                     t = a[p][q] / h;
                 else {
-                    const T theta = T(0.5) * h / a[p][q], divisor = std::fabs(theta) + std::sqrt(T(1) + theta * theta);
-                    t = static_cast<T>(1.0 / static_cast<double>(divisor));
+                    const float theta = 0.5f * h / a[p][q], divisor = std::fabs(theta) + std::sqrt(1.0f + theta * theta);
+                    t = static_cast<float>(1.0 / static_cast<double>(divisor));
                     if (theta < 0)
                         t = -t;
                 }
-                const T square = t * t + T(1), c = static_cast<T>(1.0 / std::sqrt(static_cast<double>(square)));
-                const T s = t * c, tau = s / (T(1) + c);
+                const float square = t * t + 1.0f, c = static_cast<float>(1.0 / std::sqrt(static_cast<double>(square)));
+                const float s = t * c, tau = s / (1.0f + c);
                 h = t * a[p][q];
                 z[p] -= h;
                 z[q] += h;
                 d[p][0] -= h;
                 d[q][0] += h;
                 a[p][q] = 0;
-                const auto rotate = [=](T& x, T& y) {
-                    const T gx = x, hy = y;
+                const auto rotate = [=](float& x, float& y) {
+                    const float gx = x, hy = y;
                     x = gx - s * (hy + gx * tau);
                     y = hy + s * (gx - hy * tau);
                 };
@@ -473,14 +474,14 @@ template <class T> bool nr_jacobi(Mat<T>& a, Mat<T>& d, Mat<T>& v, int* nrot) {
 }
 
 // A x = lambda B x, through L^-1 A L^-T.
-template <class T> void generalizedEigen(const Mat<T>& A, const Mat<T>& B, Mat<T>& d, Mat<T>& X) {
-    Mat<T> L = B, M, Y;
+inline void generalizedEigen(const Matrix& A, const Matrix& B, Matrix& d, Matrix& X) {
+    Matrix L = B, M, Y;
     nr_choldc(L);
     if (!inverse(transposed(L), M)) {
-        d = X = Mat<T>();
+        d = X = Matrix();
         return;
     }
-    Mat<T> C = transposed(M) * A * M;
+    Matrix C = transposed(M) * A * M;
     int rotations;
     nr_jacobi(C, d, Y, &rotations);
     X = M * Y;

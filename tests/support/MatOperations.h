@@ -10,7 +10,7 @@
 
 namespace kel_test {
 
-using Reference = kel_ref::Mat<float>;
+using Reference = kel_ref::Matrix;
 using Floats = std::vector<float>; // results of an operation, sizes and truth values included, one behind the other
 
 struct MatOperation {
