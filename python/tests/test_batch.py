@@ -56,6 +56,13 @@ def start(survey, output, *more):
                             stdout=subprocess.DEVNULL)
 
 
+def finished(run):
+    """What a run that succeeds says."""
+    message = run.communicate()[1]
+    assert run.returncode == 0, message
+    return message
+
+
 def wait_for(condition, process):
     end = time.monotonic() + 60
     while not condition():
@@ -82,14 +89,11 @@ def test_killed(survey, tmp_path):
     assert early.count(b"\n") < 59
     with open(output / "results.csv", "ab") as file:
         file.write(b"half a r")
-    again = start(survey, output, "--workers", "1")
-    message = again.communicate()[1]
-    assert again.returncode == 0, message
+    message = finished(start(survey, output, "--workers", "1"))
     assert f"{early.count(10) - 1} of 58 pairs are there already" in message
     assert (output / "results.csv").read_bytes().startswith(early)
     check(output, message)
-    third = start(survey, output)  # nothing is left: no cluster, the same page
-    assert "58 of 58" in third.communicate()[1] and third.returncode == 0
+    assert "58 of 58" in finished(start(survey, output))  # nothing is left: no cluster, the same page
     check(output, "")
 
 
@@ -100,9 +104,7 @@ def test_cluster(survey, tmp_path):
     with LocalCluster(n_workers=2, threads_per_worker=1, processes=True, dashboard_address=None) as cluster:
         counts, numbers = [], []
         for memory in ("2", "500"):
-            run = start(survey, tmp_path / memory, "--scheduler", cluster.scheduler_address, "--memory", memory)
-            message = run.communicate()[1]
-            assert run.returncode == 0, message
+            message = finished(start(survey, tmp_path / memory, "--scheduler", cluster.scheduler_address, "--memory", memory))
             check(tmp_path / memory, message)
             counts.append(int(re.search(r"10 pictures, read (\d+) times", message).group(1)))
             numbers.append({row["id"]: row["h13"] for row in rows(tmp_path / memory)})
@@ -130,9 +132,8 @@ def test_scheduler_killed(survey, tmp_path):
             process.wait()
     assert run.returncode == 1 and message.rstrip().splitlines()[-1].endswith("run the same again, and it goes on from here")
     assert "Traceback" not in message and 4 < lines() < 58
-    again = start(survey, tmp_path / "out", "--workers", "1")
-    message = again.communicate()[1]
-    assert again.returncode == 0 and "of 58 pairs are there already" in message
+    message = finished(start(survey, tmp_path / "out", "--workers", "1"))
+    assert "of 58 pairs are there already" in message
     check(tmp_path / "out", message)
 
 
