@@ -5,6 +5,7 @@
 #include <climits>
 #include <cstdlib>
 #include <iterator>
+#include <type_traits>
 
 #include "ConverterReference.h"
 #include "FilterReference.h"
@@ -22,29 +23,30 @@ constexpr int kGrey = KEL_PIXEL_TYPE_U8G, kWords = KEL_PIXEL_TYPE_S16G;
 constexpr int kProcessed[] = {0, 3, 8, 16, 24, 32, 40};
 const std::vector<int> kAllHeights = {0, 1, 2, 3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 16, 17, 41};
 
-ImageCall pair(Pair function) {
-    return [=](const Operands& o) { function(o.dst, o.src); };
-}
-template <class Function> ImageCall withParameter(Function function) {
-    return [=](const Operands& o) { function(o.dst, o.src, o.parameter); };
-}
-template <class Function> ImageCall withTmp(Function function) {
-    return [=](const Operands& o) { function(o.dst, o.src, o.tmp); };
-}
-template <class Function> ImageCall withHalf(Function function) {
-    return [=](const Operands& o) { function(o.dst, o.half, o.src, o.tmp); };
-}
-ImageCall filter(void (*function)(kelImage_t*, kelImage_t*)) {
-    return [=](const Operands& o) { function(o.dst, o.src); };
+// A function of images, and a number where it takes one, as a call of operands.
+template <class Function> ImageCall callOf(Function function) {
+    return [=](const Operands& o) {
+        if constexpr (std::is_invocable_v<Function, Operands>)
+            function(o);
+        else if constexpr (std::is_invocable_v<Function, kelImage_t*, kelImage_t*>)
+            function(o.dst, o.src);
+        else if constexpr (std::is_invocable_v<Function, kelImage_t*, kelImage_t*, int>)
+            function(o.dst, o.src, o.parameter);
+        else if constexpr (std::is_invocable_v<Function, kelImage_t*, kelImage_t*, kelImage_t*>)
+            function(o.dst, o.src, o.tmp);
+        else
+            function(o.dst, o.half, o.src, o.tmp);
+    };
 }
 
-ImageOperation operation(std::string name, int from, int to, ImageCall call, ImageCall reference) {
+template <class Call, class Reference>
+ImageOperation operation(std::string name, int from, int to, Call call, Reference reference) {
     ImageOperation o = {};
     o.name = std::move(name);
     o.from = from;
     o.to = to;
-    o.call = std::move(call);
-    o.reference = std::move(reference);
+    o.call = callOf(call);
+    o.reference = callOf(reference);
     return o;
 }
 
@@ -92,7 +94,7 @@ void addConverters(List& list) {
     // At odd widths the last V is padding; to four channels rows drift unless they are whole blocks.
     const auto settledWidth = [](int from, int to) { return from != 40 ? 61 : to == 16 || to == 32 ? 64 : 62; };
     for (const auto& c : converters) {
-        ImageOperation o = operation(c.name, c.from, c.to, pair(c.call), pair(c.reference));
+        ImageOperation o = operation(c.name, c.from, c.to, c.call, c.reference);
         const bool usesPadding = c.from == 40 || c.from == 0;
         o.leastWidth = -3;
         o.room = misplaced(c.from, c.to) ? 3 : 1;
@@ -106,7 +108,7 @@ void addConverters(List& list) {
     for (int from : kProcessed)
         for (int to : kProcessed) {
             ImageOperation o = operation("convertKelImage " + std::to_string(from) + " to " + std::to_string(to), from, to,
-                                         pair(convertKelImage), pair(kel_ref::convert));
+                                         convertKelImage, kel_ref::convert);
             o.leastWidth = from == to ? 0 : -3;
             o.room = misplaced(from, to) ? 3 : 1;
             o.rounds = from == 40;
@@ -118,17 +120,16 @@ void addConverters(List& list) {
 }
 
 void addPointOperations(List& list) {
-    ImageOperation adjust = operation("adjustKelImage", kGrey, kGrey, pair(adjustKelImage), pair(kel_ref::adjust));
+    ImageOperation adjust = operation("adjustKelImage", kGrey, kGrey, adjustKelImage, kel_ref::adjust);
     adjust.inPlace = adjust.rounds = adjust.byType = true;
     adjust.leastWidth = -3;
     adjust.settledWidth = 64;
-    ImageOperation binalize =
-        operation("binalizeKelImage", kGrey, kGrey, withParameter(binalizeKelImage), withParameter(kel_ref::binalize));
+    ImageOperation binalize = operation("binalizeKelImage", kGrey, kGrey, binalizeKelImage, kel_ref::binalize);
     binalize.inPlace = binalize.byType = true;
     binalize.leastWidth = -3;
     binalize.parameters = {100, 0, 1, 128, 255, 256, -1, INT_MIN, INT_MAX};
-    ImageOperation adaptive = operation("binalizeKelImageAdaptive", kGrey, kGrey, withTmp(binalizeKelImageAdaptive),
-                                        withTmp(kel_ref::binalizeAdaptive));
+    ImageOperation adaptive =
+        operation("binalizeKelImageAdaptive", kGrey, kGrey, binalizeKelImageAdaptive, kel_ref::binalizeAdaptive);
     adaptive.tmp = kGrey;
     adaptive.inPlace = adaptive.byType = true;
     adaptive.heights = {0, 1, 32, 33, 34, 50};
@@ -137,84 +138,75 @@ void addPointOperations(List& list) {
         list.push_back(o);
 
     adjust.byType = binalize.byType = adaptive.byType = false;
-    const auto addAs = [&](ImageOperation o, const char* name, ImageCall call) {
+    const auto addAs = [&](ImageOperation o, const char* name, auto call) {
         o.name = name;
         o.checked = false;
-        o.call = std::move(call);
+        o.call = callOf(call);
         list.push_back(o);
     };
-    addAs(adjust, "adjustKelImage_U8G", pair(adjustKelImage_U8G));
-    addAs(adjust, "adjustKelImageSSE_U8G", pair(adjustKelImageSSE_U8G));
-    addAs(binalize, "binalizeKelImage_U8G", withParameter(binalizeKelImage_U8G));
-    addAs(binalize, "binalizeKelImageSSE_U8G", withParameter(binalizeKelImageSSE_U8G));
-    addAs(adaptive, "binalizeKelImageAdaptive_U8G", withTmp(binalizeKelImageAdaptive_U8G));
-    addAs(adaptive, "binalizeKelImageAdaptiveSSE_U8G", withTmp(binalizeKelImageAdaptiveSSE_U8G));
+    addAs(adjust, "adjustKelImage_U8G", adjustKelImage_U8G);
+    addAs(adjust, "adjustKelImageSSE_U8G", adjustKelImageSSE_U8G);
+    addAs(binalize, "binalizeKelImage_U8G", binalizeKelImage_U8G);
+    addAs(binalize, "binalizeKelImageSSE_U8G", binalizeKelImageSSE_U8G);
+    addAs(adaptive, "binalizeKelImageAdaptive_U8G", binalizeKelImageAdaptive_U8G);
+    addAs(adaptive, "binalizeKelImageAdaptiveSSE_U8G", binalizeKelImageAdaptiveSSE_U8G);
 }
 
 void addFilters(List& list) {
-    const auto addSmoothing = [&](const char* name, bool half, int tmp, ImageCall call, ImageCall reference) {
-        ImageOperation o = operation(name, kGrey, kGrey, std::move(call), std::move(reference));
-        o.tmp = tmp;
-        o.half = half;
-        o.inPlace = o.byType = true;
-        o.heights = kAllHeights;
-        if (tmp == kGrey)
-            o.settled = {8, 8, 3, 3};
-        list.push_back(o);
-    };
-    const auto plain = [](const Operands& o) { kel_ref::gaussian5x5(o.dst, nullptr, o.src, o.tmp); };
-    const auto plain7 = [](const Operands& o) { kel_ref::gaussian7x7(o.dst, nullptr, o.src, o.tmp); };
-    addSmoothing("applyKelFilterGaussian5X5", false, kWords, withTmp(applyKelFilterGaussian5X5), plain);
-    addSmoothing("applyKelFilterGaussian5X5_downsampling", true, kWords, withHalf(applyKelFilterGaussian5X5_downsampling),
-                 withHalf(kel_ref::gaussian5x5));
-    addSmoothing("applyKelFilterGaussian7X7", false, kGrey, withTmp(applyKelFilterGaussian7X7), plain7);
-    addSmoothing("applyKelFilterGaussianSSE7X7", false, kGrey, withTmp(applyKelFilterGaussianSSE7X7), plain7);
-    addSmoothing("applyKelFilterGaussian7X7_downsampling", true, kGrey, withHalf(applyKelFilterGaussian7X7_downsampling),
-                 withHalf(kel_ref::gaussian7x7));
-    addSmoothing("applyKelFilterGaussianSSE7X7_downsampling", true, kGrey, withHalf(applyKelFilterGaussianSSE7X7_downsampling),
-                 withHalf(kel_ref::gaussian7x7));
-
-    const auto add = [&](const char* name, int to, ImageCall call, ImageCall reference) -> ImageOperation& {
-        list.push_back(operation(name, kGrey, to, std::move(call), std::move(reference)));
+    const auto add = [&](const char* name, int to, auto call, auto reference) -> ImageOperation& {
+        list.push_back(operation(name, kGrey, to, call, reference));
         list.back().heights = kAllHeights;
         list.back().byType = true;
         return list.back();
     };
+    const auto addSmoothing = [&](const char* name, bool half, int tmp, auto call, auto reference) {
+        ImageOperation& o = add(name, kGrey, call, reference);
+        o.tmp = tmp;
+        o.half = half;
+        o.inPlace = true;
+        if (tmp == kGrey)
+            o.settled = {8, 8, 3, 3};
+    };
+#define KEL_SMOOTHING(name, half, tmp, reference) addSmoothing(#name, half, tmp, name, kel_ref::reference)
+    KEL_SMOOTHING(applyKelFilterGaussian5X5, false, kWords, gaussian5x5);
+    KEL_SMOOTHING(applyKelFilterGaussian5X5_downsampling, true, kWords, gaussian5x5);
+    KEL_SMOOTHING(applyKelFilterGaussian7X7, false, kGrey, gaussian7x7);
+    KEL_SMOOTHING(applyKelFilterGaussianSSE7X7, false, kGrey, gaussian7x7);
+    KEL_SMOOTHING(applyKelFilterGaussian7X7_downsampling, true, kGrey, gaussian7x7);
+    KEL_SMOOTHING(applyKelFilterGaussianSSE7X7_downsampling, true, kGrey, gaussian7x7);
+
     for (const bool sse : {false, true}) {
-        ImageOperation& cross =
-            add(sse ? "applyKelFilterLaplacianSSE3X3" : "applyKelFilterLaplacian3X3", kWords,
-                filter(sse ? applyKelFilterLaplacianSSE3X3 : applyKelFilterLaplacian3X3), filter(kel_ref::cross));
-        cross.settled = {8, 5, 5, 5};
+        add(sse ? "applyKelFilterLaplacianSSE3X3" : "applyKelFilterLaplacian3X3", kWords,
+            sse ? applyKelFilterLaplacianSSE3X3 : applyKelFilterLaplacian3X3, kel_ref::cross)
+            .settled = {8, 5, 5, 5};
         ImageOperation& sobel = add(sse ? "applyKelFilterSobelSSE3X3" : "applyKelFilterSobel3X3", kWords,
-                                    filter(sse ? applyKelFilterSobelSSE3X3 : applyKelFilterSobel3X3), filter(kel_ref::sobel));
+                                    sse ? applyKelFilterSobelSSE3X3 : applyKelFilterSobel3X3, kel_ref::sobel);
         sobel.settled = {16, 16, 1, 1};
         sobel.rounds = true;
     }
-    ImageOperation& rank = add("applyKelFilterMedianNXN", kGrey, withParameter(applyKelFilterMedianNXN),
+    ImageOperation& rank = add("applyKelFilterMedianNXN", kGrey, applyKelFilterMedianNXN,
                                [](const Operands& o) { kel_ref::rank(o.dst, o.src, std::min(o.parameter, 1 << 20)); });
     rank.parameters = {1, 2, 3, 40, 1 << 30, 0, -1};
     rank.heights = {0, 1, 3, 6, 7, 12};
-    add("applyKelFilterMedian3X3", kGrey, filter(applyKelFilterMedian3X3), pair(kel_ref::nothing)).settledWidth = 0;
-    ImageOperation& noise =
-        add("applyKelFilterNoise", kGrey, withParameter(applyKelFilterNoise), withParameter(kel_ref::noise));
+    add("applyKelFilterMedian3X3", kGrey, applyKelFilterMedian3X3, kel_ref::nothing).settledWidth = 0;
+    ImageOperation& noise = add("applyKelFilterNoise", kGrey, applyKelFilterNoise, kel_ref::noise);
     noise.parameters = {10, 0, 1, 255, 100000, -1, -7, INT_MAX, INT_MIN};
     noise.heights = {0, 1, 2, 9};
     noise.inPlace = noise.draws = true;
 }
 
 void addTransforms(List& list) {
-    const auto add = [&](const char* name, int type, ImageCall call, ImageCall reference) -> ImageOperation& {
-        list.push_back(
-            operation(std::string(name) + " " + std::to_string(type), type, type, std::move(call), std::move(reference)));
+    const auto add = [&](const char* name, int type, auto call, auto reference) -> ImageOperation& {
+        list.push_back(operation(std::string(name) + " " + std::to_string(type), type, type, call, reference));
         list.back().byType = true;
         return list.back();
     };
     for (int type : {0, 3, 8, 16, 24, 32}) {
-        add("resizeKelImage", type, pair(resizeKelImage), pair(kel_ref::nothing)).settledWidth = 0;
+        add("resizeKelImage", type, resizeKelImage, kel_ref::nothing).settledWidth = 0;
         for (const bool linear : {false, true}) {
-            ImageOperation& o = add(linear ? "resizeKelImageBilinear" : "resizeKelImageNearest", type,
-                                    pair(linear ? resizeKelImageBilinear : resizeKelImageNearest),
-                                    pair(linear ? kel_ref::bilinear : kel_ref::nearest));
+            ImageOperation& o =
+                add(linear ? "resizeKelImageBilinear" : "resizeKelImageNearest", type,
+                    linear ? resizeKelImageBilinear : resizeKelImageNearest, linear ? kel_ref::bilinear : kel_ref::nearest);
             o.rounds = true;
             o.leastWidth = 1; // ratios across: 0, an enlargement, to 7; down: another; the rest of a division stays unused
             o.heights = {1, 3, 8, 9};
@@ -225,14 +217,12 @@ void addTransforms(List& list) {
             };
             o.settledWidth = linear && type != 0 ? 0 : 64;
         }
-        ImageOperation& half = add("resizeKelImageHalf", type, pair(resizeKelImageHalf), pair(kel_ref::half));
+        ImageOperation& half = add("resizeKelImageHalf", type, resizeKelImageHalf, kel_ref::half);
         half.size = [](Size src, int) { return Size{src.width / 2, src.height / 2}; };
         half.withinPixels = true;
-        ImageOperation& larger =
-            add("resizeKelImageEnborder", type, withParameter(resizeKelImageEnborder), withParameter(kel_ref::enborder));
+        ImageOperation& larger = add("resizeKelImageEnborder", type, resizeKelImageEnborder, kel_ref::enborder);
         larger.size = [](Size src, int size) { return Size{src.width + 2 * size, src.height + 2 * size}; };
-        ImageOperation& smaller =
-            add("resizeKelImageDeborder", type, withParameter(resizeKelImageDeborder), withParameter(kel_ref::deborder));
+        ImageOperation& smaller = add("resizeKelImageDeborder", type, resizeKelImageDeborder, kel_ref::deborder);
         smaller.size = [](Size src, int size) { return Size{src.width - 2 * size, src.height - 2 * size}; };
         smaller.withinPixels = true;
         larger.parameters = smaller.parameters = {0, 1, 2, 7, 16, 19};
@@ -241,9 +231,8 @@ void addTransforms(List& list) {
         larger.settledWidth = 64; // rows by width in some types
         smaller.heights = {0, 2, 5, 40};
         const auto addFlip = [&](const char* name, Pair call, bool mirrored, bool upsideDown) {
-            add(name, type, pair(call), [=](const Operands& o) {
-                kel_ref::flip(o.dst, o.src, mirrored, upsideDown);
-            }).withinPixels = true;
+            const auto reference = [=](const Operands& o) { kel_ref::flip(o.dst, o.src, mirrored, upsideDown); };
+            add(name, type, call, reference).withinPixels = true;
         };
         addFlip("rotateKelImageH", rotateKelImageH, true, false);
         addFlip("rotateKelImageV", rotateKelImageV, false, true);
@@ -263,13 +252,12 @@ void addTransforms(List& list) {
         warp.size = [](Size src, int) { return Size{(src.width + 13) % 90, src.height + 3}; };
     }
     for (int type : {16, 32}) {
-        ImageOperation& larger =
-            add("resizeLinerInterpolation", type, pair(resizeLinerInterpolation), pair(kel_ref::linearInterpolation));
+        ImageOperation& larger = add("resizeLinerInterpolation", type, resizeLinerInterpolation, kel_ref::linearInterpolation);
         larger.parameters = {10, 15, 20, 27, 31}; // tenths
         larger.size = [](Size src, int tenths) { return Size{src.width * tenths / 10, src.height * tenths / 10}; };
         larger.behind = 4;
         ImageOperation& smaller =
-            add("zero_order_hold_plus_ave", type, pair(zero_order_hold_plus_ave), pair(kel_ref::zeroOrderHoldPlusAverage));
+            add("zero_order_hold_plus_ave", type, zero_order_hold_plus_ave, kel_ref::zeroOrderHoldPlusAverage);
         smaller.parameters = {10, 15, 20, 27, 31, 1000000};
         smaller.size = [](Size src, int tenths) {
             return Size{std::max(1, src.width * 10 / tenths), std::max(1, src.height * 10 / tenths)};
