@@ -19,7 +19,7 @@ using namespace kel_examples;
 
 namespace {
 
-constexpr int kMostFeatures = 240;
+constexpr int kMostFeatures = 280;
 constexpr float kThreshold = 2;    // pixels of the halved picture that features are taken from
 constexpr float kFollow = 0.06f;   // share of the way back to the frame as it is, per frame
 constexpr float kFarthest = 0.15f; // of the picture's width that a correction may move a corner where nothing is cut off
