@@ -1,4 +1,4 @@
-// Converters and their dispatcher, byte for byte beside plain references, in guarded images.
+// Converters and their dispatcher where the sweep over the list does not go.
 #include <cfenv>
 #include <cmath>
 #include <gtest/gtest.h>

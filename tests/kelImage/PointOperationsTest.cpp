@@ -1,4 +1,4 @@
-// Contrast stretching and binarization, byte for byte beside plain references, in guarded images.
+// Contrast stretching and binarization where the sweep over the list does not go.
 #include <cfenv>
 #include <gtest/gtest.h>
 

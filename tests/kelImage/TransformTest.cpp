@@ -1,4 +1,4 @@
-// Resizing, borders, flips and warp against plain references, byte for byte, padding and neighbours included.
+// Resizing, borders, flips and warp where the sweep over the list does not go.
 #include <cfenv>
 #include <cmath>
 #include <limits>
@@ -6,11 +6,7 @@
 #include "ImageScene.h"
 #include "Stops.h"
 
-namespace {
-
 using namespace kel_test;
-
-} // namespace
 
 // Beyond the sizes where single precision is exact.
 TEST(Resizing, RoundsThePositionsOfHugeImages) {
