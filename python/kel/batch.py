@@ -6,6 +6,7 @@ that a run that was broken off goes on where it stopped; index.html shows it.
 
 import argparse
 import collections
+import contextlib
 import csv
 import fcntl
 import hashlib
@@ -199,11 +200,14 @@ class Results:
         os.fsync(self.file.fileno())
 
     def add(self, rows: Sequence[Row]) -> None:
-        for row, shown in rows:
-            if shown:
-                with open(os.path.join(self.folder, picture_of(row[0])), "wb") as file:
-                    file.write(shown)
-        self._append([row for row, _ in rows])
+        try:
+            for row, shown in rows:
+                if shown:
+                    with open(os.path.join(self.folder, picture_of(row[0])), "wb") as file:
+                        file.write(shown)
+            self._append([row for row, _ in rows])
+        except OSError as error:
+            raise Refused(f"{self.folder}: {error}; run the same again, and it goes on from here") from error
         self.rows.extend(row for row, _ in rows)
 
 
@@ -247,10 +251,15 @@ def write_page(results: Results) -> None:
                    f"<title>{i / 20:.2f} to {(i + 1) / 20:.2f}: {n}</title></rect>" for i, n in enumerate(bins))
     bars += "".join(f'<text x="{20 + 420 * i}" y="147" text-anchor="middle">{i}</text>' for i in (0, 0.5, 1))
     page = PAGE % {"found": sum(row[1] == "1" for row in results.rows), "all": len(rows), "bars": bars, "rows": "\n".join(rows)}
-    with tempfile.NamedTemporaryFile("w", dir=results.folder, delete=False, encoding="utf-8") as file:
-        file.write(page)
-    os.chmod(file.name, 0o644)
-    os.replace(file.name, os.path.join(results.folder, "index.html"))
+    file = tempfile.NamedTemporaryFile("w", dir=results.folder, delete=False, encoding="utf-8")
+    try:
+        with file:
+            file.write(page)
+        os.chmod(file.name, 0o644)
+        os.replace(file.name, os.path.join(results.folder, "index.html"))
+    except OSError:
+        os.unlink(file.name)
+        raise
 
 
 # ---- The run ----------------------------------------------------------------------------------------------------------------
@@ -468,17 +477,16 @@ def distribute(client: Any, pairs: List[Pair], settings: Settings, batch: int, r
 def run(pairs: List[Pair], settings: Settings, arguments: argparse.Namespace, results: Results) -> None:
     with tempfile.TemporaryDirectory(prefix="kel-batch-", ignore_cleanup_errors=True) as folder:
         client = connect(arguments, folder)
-        from distributed.comm import CommClosedError
-
         try:
             bar = Bar(len(results.rows), len(results.rows) + len(pairs))
             read = distribute(client, pairs, settings, arguments.batch, results, bar)
             print(f"{len({path for pair in pairs for path in pair[1:]})} pictures, read {read} times", file=sys.stderr)
-        except CommClosedError:
+        except OSError:  # of Dask's, at any call
             raise Refused("the scheduler is gone; run the same again, and it goes on from here") from None
         finally:
             cluster = client.cluster  # ours
-            client.close()
+            with contextlib.suppress(OSError):  # it may look for a scheduler that is gone
+                client.close()
             if cluster is not None:
                 cluster.close()
 
@@ -535,6 +543,9 @@ def main(words: Optional[Sequence[str]] = None) -> int:
             write_page(results)
     except Refused as error:
         print(f"kel.batch: {error}", file=sys.stderr)
+        return 1
+    except OSError as error:  # a full disk, say
+        print(f"kel.batch: {arguments.output}: {error}", file=sys.stderr)
         return 1
     except KeyboardInterrupt:
         print("\nkel.batch: broken off; run the same again, and it goes on from here", file=sys.stderr)
