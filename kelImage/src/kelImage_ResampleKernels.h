@@ -123,8 +123,10 @@ private:
 template <int first>
 constexpr Sixteen kWordsSideBySide = {
     {first, -1, first + 4, -1, first + 1, -1, first + 5, -1, first + 2, -1, first + 6, -1, first + 3, -1, first + 7, -1}};
-// Weights and the box are even, the box up to 8206, and so are sums, longs below 2^21. Groups are fours: weights of their first two inputs, and behind those of all pixels the ones of the other two. One more than a sum over the box
-// is off by less than 256 / 2^22 in single precision, however the thread rounds, and 1 / 8206 or more from whole numbers.
+
+// Weights and the box are even, the box up to 8206, and so are sums, longs below 2^21. Groups are fours: weights of their first two
+// inputs, and behind those of all pixels the ones of the other two. One more than a sum over the box is off by less than 256 / 2^22
+// in single precision, however the thread rounds, and 1 / 8206 or more from whole numbers.
 struct LongBox {
     static constexpr ptrdiff_t kWeights = 8;
     float reciprocal;
